@@ -1,0 +1,45 @@
+// Turns the reader's tokens into records: a value goes where the stack of open elements says, a
+// finished target goes to xmlparser::alltargets, and the end of the document rebuilds
+// xmlparser::allservices and lists the whole configuration in the log at DEBUG.
+//
+// Three habits of this file format live here; configurations in use rely on them:
+//   carry-over      The work records are never cleared. A field that a service leaves out keeps
+//                   the value of the previous service of its kind, across targets and refreshes.
+//   empty elements  An element without text stores the last text token before it, which nearly
+//                   always is the ">" that the reader delivers behind an end tag.
+//   unknown names   An element of another name, a comment included, stays open for ever. Inside a
+//                   target it loses that target; between targets it is harmless.
+//
+// Everything here runs on the manager's thread, called by xmlparser::parse; it takes no lock and
+// raises nothing of its own. The state outlives a parse and is reset by nobody.
+#pragma once
+
+#include <stack>
+#include <string>
+#include <vector>
+
+#include "wdmonitortarget.h"
+
+extern std::stack<std::string> xercecstack;    // elements opened and not closed, innermost on top
+extern std::string charparse;                  // the last text token
+extern service monitorservice;                 // work record of wdmonitorservice
+extern service monservicedep;                  // work record of wdmondependsev
+extern std::vector<service> monservicedepends; // dependents of the current wdmonitortarget
+extern wdmonitortarget target;                 // the target being built
+
+// A start tag: `name` is everything between its brackets, trimmed.
+void startElement(const std::string& name);
+
+// A piece of text, trimmed.
+void characters(const std::string& text);
+
+// An end tag. Closes the innermost open element, whatever `name` says; does nothing when none is
+// open or the innermost one is of an unknown name.
+void endElement(const std::string& name);
+
+// The end of the file.
+void endDocument();
+
+// Appends a copy of `candidate` to `services` and returns 1, unless a service of that name is
+// there already: then 0, and nothing changes.
+int addservice(const service& candidate, std::vector<service>& services);
