@@ -1,0 +1,458 @@
+#include "ProcessStatistics_Linux.h"
+
+#include <cerrno>
+#include <sstream>
+
+#include "daemontest.h"
+
+namespace {
+
+class UtilityTest : public DaemonTest {
+protected:
+    UtilityTest() : DaemonTest("ProcessStatistics") {}
+
+    void commandprints(Output output)
+    {
+        world.onpopen = [output](const std::string&) {
+            return output;
+        };
+    }
+};
+
+TEST_F(UtilityTest, ExecOfACommandThatPrintsNothingEmptiesTheOutput)
+{
+    commandprints({});
+    std::string output = "old";
+    EXPECT_EQ(Utility::exec("true", output), 0);
+    EXPECT_EQ(output, "");
+}
+
+TEST_F(UtilityTest, ExecThatCannotStartLeavesTheOutput)
+{
+    world.onpopen = [](const std::string&) {
+        return std::nullopt;
+    };
+    std::string output = "old";
+    EXPECT_EQ(Utility::exec("true", output), 1);
+    EXPECT_EQ(output, "old");
+}
+
+TEST_F(UtilityTest, ExecCollectsALineLongerThanItsBuffer)
+{
+    const std::string line = std::string(300, 'x') + "\n";
+    commandprints({line});
+    std::string output;
+    EXPECT_EQ(Utility::exec("long", output), 0);
+    EXPECT_EQ(output, line);
+}
+
+TEST_F(UtilityTest, ExecKeepsAllLinesAndTheirNewlines)
+{
+    commandprints({std::string("one\ntw"), std::string("o\n"), std::string("three")});
+    std::string output;
+    Utility::exec("lines", output);
+    EXPECT_EQ(output, "one\ntwo\nthree");
+}
+
+TEST_F(UtilityTest, ExecClosesThePipeAndOpensItCloseOnExec)
+{
+    std::string output;
+    Utility::exec("something", output);
+    EXPECT_EQ(world.events(), lines({"popen re something", "pclose"}));
+}
+
+TEST_F(UtilityTest, ExecReadsOnAfterAnInterruption)
+{
+    commandprints({std::string("one\n"), EINTR, std::string("two\n")});
+    std::string output;
+    EXPECT_EQ(Utility::exec("interrupted", output), 0);
+    EXPECT_EQ(output, "one\ntwo\n");
+}
+
+TEST_F(UtilityTest, ExecStopsAtAReadError)
+{
+    commandprints({std::string("one\n"), EIO, std::string("two\n")});
+    std::string output;
+    EXPECT_EQ(Utility::exec("broken", output), 0);
+    EXPECT_EQ(output, "one\n");
+    EXPECT_EQ(world.events(), lines({"popen re broken", "pclose"}));
+}
+
+TEST_F(UtilityTest, ExecOfAMissingProgramIsStillZero)
+{
+    // The shell starts, complains on standard error and prints nothing.
+    commandprints({});
+    std::string output;
+    EXPECT_EQ(Utility::exec("/no/such/program", output), 0);
+    EXPECT_EQ(output, "");
+}
+
+TEST_F(UtilityTest, PidofReturnsTheTextAsItStands)
+{
+    commandprints({std::string("12 7\n")});
+    EXPECT_EQ(Utility::pidof("web"), "12 7\n");
+    EXPECT_EQ(world.events(), lines({"popen re pidof web", "pclose"}));
+}
+
+TEST_F(UtilityTest, PidofOfAPathFallsBackToItsLastComponent)
+{
+    world.onpopen = [](const std::string& command) {
+        return command == "pidof `basename /usr/sbin/web`" ? Output{std::string("31\n")} : Output{};
+    };
+    EXPECT_EQ(Utility::pidof("/usr/sbin/web"), "31\n");
+    EXPECT_EQ(world.events(), lines({"popen re pidof /usr/sbin/web", "pclose",
+                                     "popen re pidof `basename /usr/sbin/web`", "pclose"}));
+}
+
+TEST_F(UtilityTest, PidofOfAProgramThatIsNotRunningIsEmptyAndReadsAsZero)
+{
+    EXPECT_EQ(Utility::pidof("gone"), "");
+    EXPECT_EQ(Utility::str2int(Utility::pidof("gone")), 0);
+}
+
+TEST_F(UtilityTest, Str2intReadsTheNumberAtTheStart)
+{
+    EXPECT_EQ(Utility::str2int("  -17abc"), -17);
+    EXPECT_EQ(Utility::str2int("12 7\n"), 12);
+    EXPECT_EQ(Utility::str2int("+5"), 5);
+    EXPECT_EQ(Utility::str2int("60s"), 60);
+    EXPECT_EQ(Utility::str2int("010"), 10);
+    EXPECT_EQ(Utility::str2int("0x10"), 0);
+}
+
+TEST_F(UtilityTest, Str2intOfNoNumberIsZero)
+{
+    EXPECT_EQ(Utility::str2int(""), 0);
+    EXPECT_EQ(Utility::str2int("abc"), 0);
+    EXPECT_EQ(Utility::str2int("-"), 0);
+}
+
+TEST_F(UtilityTest, Str2intOfANumberBeyondIntIsTheNearest)
+{
+    EXPECT_EQ(Utility::str2int("99999999999"), 2147483647);
+    EXPECT_EQ(Utility::str2int("-99999999999"), -2147483647 - 1);
+}
+
+using Pieces = std::vector<std::string>;
+
+TEST_F(UtilityTest, Split2KeepsEmptyPiecesBetweenSeparators)
+{
+    Pieces pieces;
+    EXPECT_EQ(&Utility::split2("a  b", ' ', pieces), &pieces);
+    EXPECT_EQ(pieces, (Pieces{"a", "", "b"}));
+}
+
+TEST_F(UtilityTest, Split2GivesNothingBehindALastSeparatorAndOneBeforeAFirst)
+{
+    Pieces pieces;
+    Utility::split2("a b ", ' ', pieces);
+    EXPECT_EQ(pieces, (Pieces{"a", "b"}));
+    EXPECT_EQ(Utility::split(" a", ' '), (Pieces{"", "a"}));
+}
+
+TEST_F(UtilityTest, Split2AppendsToWhatIsThere)
+{
+    Pieces pieces{"old"};
+    Utility::split2("", ' ', pieces);
+    EXPECT_EQ(pieces, (Pieces{"old"}));
+    Utility::split2("new", ' ', pieces);
+    EXPECT_EQ(pieces, (Pieces{"old", "new"}));
+}
+
+TEST_F(UtilityTest, SplitKeepsATrailingNewline)
+{
+    EXPECT_EQ(Utility::split("x,y\n", ','), (Pieces{"x", "y\n"}));
+}
+
+// A stat file with these figures in its 14th, 20th and 24th field.
+std::string stat(const std::string& userticks, const std::string& threads, const std::string& pages,
+                 const std::string& program = "(web)")
+{
+    return "42 " + program + " S 1 42 42 0 -1 4194560 1 2 3 4 " + userticks + " 777 15 16 20 0 " +
+           threads + " 21 22 23 " + pages + " 25 26\n";
+}
+
+class Statistics : public DaemonTest {
+protected:
+    Statistics() : DaemonTest("ProcessStatistics") {}
+
+    void SetUp() override
+    {
+        DaemonTest::SetUp();
+        processis(42);
+        stats.SetName("web");
+        stats.SetThresholdAverageCPUUsage("900");
+        stats.SetThresholdThreadCount("50");
+        stats.SetThresholdMemoryUsage("900");
+    }
+
+    void processis(int pid)
+    {
+        world.onpopen = [pid](const std::string&) {
+            return pid == 0 ? Output{} : Output{std::to_string(pid) + "\n"};
+        };
+    }
+
+    void statis(const std::string& content)
+    {
+        world.files["/proc/42/stat"] = content;
+    }
+
+    // The log of one check, and its result.
+    std::string check()
+    {
+        const std::size_t before = world.events().size();
+        const bool reached = stats.IsThresholdReached();
+        const std::string all = world.events().substr(before);
+        std::string log;
+        std::istringstream text(all);
+        for (std::string line; std::getline(text, line);) {
+            if (!line.starts_with("popen") && !line.starts_with("pclose")) {
+                log += line + "\n";
+            }
+        }
+        EXPECT_EQ(reached, log.find(") Threshold is reached") != std::string::npos);
+        return log;
+    }
+
+    static std::string figures(int cpu, int threads, int pages, bool reached)
+    {
+        return lines({
+            "DEBUG (web) averageCPUUsage/Threshold:" + std::to_string(cpu) + "/900",
+            "DEBUG (web) numberOfThreads/Threshold:" + std::to_string(threads) + "/50",
+            "DEBUG (web) memoryUsage/Threshold:" + std::to_string(pages) + "/900",
+            reached ? "DEBUG (web) Threshold is reached" : "DEBUG (web) Threshold is not reached",
+        });
+    }
+
+    // The CPU figure after `ticks` more user ticks in `seconds`.
+    std::string cpuafter(long ticks, long seconds)
+    {
+        statis(stat("0", "1", "1"));
+        check();
+        statis(stat(std::to_string(ticks), "1", "1"));
+        world.now += seconds;
+        const std::string log = check();
+        const std::string label = "averageCPUUsage/Threshold:";
+        const std::size_t start = log.find(label) + label.size();
+        return log.substr(start, log.find('/', start) - start);
+    }
+
+    const std::string changed = "DEBUG (web) PID changed (old = -1, new = 42)\n";
+    ProcessStatistics stats;
+};
+
+TEST_F(Statistics, ThresholdsAreReadFromText)
+{
+    EXPECT_EQ(stats.GetThresholdAverageCPUUsage(), 900);
+    EXPECT_EQ(stats.GetThresholdThreadCount(), 50);
+    EXPECT_EQ(stats.GetThresholdMemoryUsage(), 900);
+    stats.SetThresholdMemoryUsage("many");
+    EXPECT_EQ(stats.GetThresholdMemoryUsage(), 0);
+    stats.SetThresholdMemoryUsage("");
+    EXPECT_EQ(stats.GetThresholdMemoryUsage(), 0);
+}
+
+TEST_F(Statistics, FirstCheckTakesABaselineAndIsNotReached)
+{
+    statis(stat("5000", "3", "800"));
+    EXPECT_EQ(check(), changed + figures(0, 3, 800, false));
+}
+
+TEST_F(Statistics, FigureAtItsThresholdIsNotReached)
+{
+    statis(stat("0", "50", "900"));
+    EXPECT_EQ(check(), changed + figures(0, 50, 900, false));
+}
+
+TEST_F(Statistics, MoreThreadsThanAllowedReachTheThreshold)
+{
+    statis(stat("0", "51", "1"));
+    EXPECT_EQ(check(), changed + figures(0, 51, 1, true));
+}
+
+TEST_F(Statistics, MorePagesThanAllowedReachTheThreshold)
+{
+    statis(stat("0", "1", "901"));
+    EXPECT_EQ(check(), changed + figures(0, 1, 901, true));
+}
+
+TEST_F(Statistics, CpuFigureIsTicksPerSecondTimesThousand)
+{
+    EXPECT_EQ(cpuafter(25, 50), "500");
+}
+
+TEST_F(Statistics, CpuFigureIsTruncated)
+{
+    EXPECT_EQ(cpuafter(7, 3), "2333");
+}
+
+TEST_F(Statistics, CpuFigureAboveItsThresholdReachesIt)
+{
+    statis(stat("0", "1", "1"));
+    check();
+    statis(stat("10", "1", "1"));
+    world.now += 10;
+    EXPECT_EQ(check(), figures(1000, 1, 1, true));
+}
+
+TEST_F(Statistics, CpuFigureIsTakenBetweenTheLastTwoChecksOnly)
+{
+    cpuafter(100, 10);
+    statis(stat("101", "1", "1"));
+    world.now += 10;
+    EXPECT_EQ(check(), figures(100, 1, 1, false));
+}
+
+TEST_F(Statistics, ClockSteppedBackGivesANegativeFigure)
+{
+    EXPECT_EQ(cpuafter(10, -5), "-2000");
+}
+
+TEST_F(Statistics, CpuArithmeticWrapsAtThirtyTwoBits)
+{
+    EXPECT_EQ(cpuafter(2147484, 1), "-2147483296");
+}
+
+TEST_F(Statistics, TheOneQuotientBeyondIntWrapsToo)
+{
+    // 2^28 * 1000 is -2^31 in 32 bits, and so would be its negative.
+    EXPECT_EQ(cpuafter(268435456, -1), "-2147483648");
+}
+
+TEST_F(Statistics, TimesBeyondIntWrap)
+{
+    world.now = 4294967296L + 1000;
+    EXPECT_EQ(cpuafter(25, 50), "500");
+}
+
+TEST_F(Statistics, TwoChecksInOneSecondKeepTheFigure)
+{
+    cpuafter(5, 10);
+    EXPECT_EQ(check(),
+              "DEBUG Refresh called twice in zero time interval\n" + figures(500, 1, 1, false));
+}
+
+TEST_F(Statistics, UnsetThresholdsAreReachedByAnyLiveProcess)
+{
+    stats = ProcessStatistics("web");
+    statis(stat("0", "1", "0"));
+    EXPECT_TRUE(stats.IsThresholdReached());
+}
+
+TEST_F(Statistics, RestartedProcessIsFollowedAndKeepsTheOldCpuFigureOnce)
+{
+    cpuafter(5, 10);
+    processis(43);
+    world.files["/proc/43/stat"] = stat("2", "7", "8");
+    world.now += 10;
+    EXPECT_EQ(check(),
+              "DEBUG (web) PID changed (old = 42, new = 43)\n" + figures(500, 7, 8, false));
+    world.files["/proc/43/stat"] = stat("3", "7", "8");
+    world.now += 10;
+    EXPECT_EQ(check(), figures(100, 7, 8, false));
+}
+
+TEST_F(Statistics, FirstOfSeveralProcessesCounts)
+{
+    world.onpopen = [](const std::string&) {
+        return Output{std::string("42 41 40\n")};
+    };
+    statis(stat("0", "1", "1"));
+    EXPECT_EQ(check(), changed + figures(0, 1, 1, false));
+}
+
+TEST_F(Statistics, GoneProcessIsReportedEachTimeAndTheLastFiguresDecide)
+{
+    statis(stat("0", "51", "1"));
+    check();
+    processis(0);
+    const std::string unable = "ERROR (web) Unable to fetch stats of process from system\n";
+    EXPECT_EQ(check(),
+              "DEBUG (web) PID changed (old = 42, new = 0)\n" + unable + figures(0, 51, 1, true));
+    EXPECT_EQ(check(), unable + figures(0, 51, 1, true));
+}
+
+TEST_F(Statistics, ProgramNeverSeenDecidesOnZeroes)
+{
+    processis(0);
+    EXPECT_EQ(check(), "DEBUG (web) PID changed (old = -1, new = 0)\n"
+                       "ERROR (web) Unable to fetch stats of process from system\n" +
+                           figures(0, 0, 0, false));
+}
+
+TEST_F(Statistics, BlankInTheProgramNameShiftsTheFieldsByOne)
+{
+    // Threads are then field 19, which holds 0, and pages field 23, which holds 23.
+    statis(stat("0", "3", "800", "(web server)"));
+    EXPECT_EQ(check(), changed + figures(0, 0, 23, false));
+}
+
+TEST_F(Statistics, FetchFillsTheCallersFields)
+{
+    statis(stat("5", "6", "7"));
+    stats.UpdatePID();
+    std::vector<std::string> fields{"old"};
+    EXPECT_EQ(stats.FetchStatisticsFromSystem(fields), 0);
+    ASSERT_EQ(fields.size(), 26U);
+    EXPECT_EQ(fields[13], "5");
+    EXPECT_EQ(fields[19], "6");
+    EXPECT_EQ(fields[23], "7");
+    EXPECT_EQ(fields[25], "26\n");
+}
+
+TEST_F(Statistics, FailedFetchLeavesTheCallersFields)
+{
+    stats.UpdatePID();
+    std::vector<std::string> fields{"old"};
+    EXPECT_EQ(stats.FetchStatisticsFromSystem(fields), 1);
+    EXPECT_EQ(fields, (Pieces{"old"}));
+    EXPECT_EQ(stats.Refresh(), 1);
+}
+
+// Ends the file at its 24th field.
+std::string cutafterpages(const std::string& content)
+{
+    return content.substr(0, content.find(" 25 26"));
+}
+
+TEST_F(Statistics, FewerThanTwentyFourFieldsAreAFailedFetch)
+{
+    statis(stat("0", "51", "1"));
+    check();
+    const std::string whole = cutafterpages(stat("9", "1", "1"));
+    statis(whole.substr(0, whole.rfind(' ')));
+    world.now += 10;
+    EXPECT_EQ(check(), "ERROR (web) Unable to fetch stats of process from system\n" +
+                           figures(0, 51, 1, true));
+}
+
+TEST_F(Statistics, TwentyFourFieldsAreEnough)
+{
+    statis(cutafterpages(stat("0", "3", "800")));
+    EXPECT_EQ(check(), changed + figures(0, 3, 800, false));
+}
+
+TEST_F(Statistics, ByteOf0xFFEndsTheReading)
+{
+    statis(stat("0", "3", "800", "(w\xFFz)"));
+    EXPECT_EQ(check(), changed + "ERROR (web) Unable to fetch stats of process from system\n" +
+                           figures(0, 0, 0, false));
+}
+
+TEST_F(Statistics, NonNumericFieldsReadAsZero)
+{
+    statis(stat("x", "y", "z"));
+    EXPECT_EQ(check(), changed + figures(0, 0, 0, false));
+}
+
+TEST_F(Statistics, CopyTakesTheFiguresAlong)
+{
+    statis(stat("0", "51", "1"));
+    check();
+    processis(0);
+    ProcessStatistics copy = stats;
+    EXPECT_TRUE(copy.IsThresholdReached());
+}
+
+} // namespace
