@@ -5,6 +5,8 @@
 
 #include "wdLocalLog_linux.h"
 #include "wdsettings.h"
+#include "wdxmlparserhandler.h"
+#include "xmlparser.h"
 
 namespace {
 
@@ -14,6 +16,14 @@ void resetstate()
     wdlocallogpath.clear();
     globalrefresh = 0;
     debugenable = true;
+    xmlparser::allservices.clear();
+    xmlparser::alltargets.clear();
+    xercecstack = {};
+    charparse.clear();
+    monitorservice = {};
+    monservicedep = {};
+    monservicedepends.clear();
+    target = {};
 }
 
 } // namespace
