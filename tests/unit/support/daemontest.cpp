@@ -4,6 +4,7 @@
 #include <utility>
 
 #include "wdLocalLog_linux.h"
+#include "wdmonitorthread_linux.h"
 #include "wdsettings.h"
 #include "wdxmlparserhandler.h"
 #include "xmlparser.h"
@@ -16,6 +17,7 @@ void resetstate()
     wdlocallogpath.clear();
     globalrefresh = 0;
     debugenable = true;
+    globalenable = 0;
     xmlparser::allservices.clear();
     xmlparser::alltargets.clear();
     xercecstack = {};
