@@ -3,6 +3,8 @@
 #include "wdxmlparserhandler.h"
 
 #include <array>
+#include <fstream>
+#include <iterator>
 #include <stdexcept>
 
 #include "daemontest.h"
@@ -137,6 +139,25 @@ TEST_F(Handler, DocumentWithADependentFillsEveryFieldOfBoth)
     EXPECT_EQ(names(xmlparser::allservices), (Names{"webagent", "datastore"}));
     expectfull(xmlparser::allservices[0], "webagent", "-m");
     expectfull(xmlparser::allservices[1], "datastore", "-d");
+}
+
+TEST_F(Handler, SampleConfigurationSaysEverythingOfBothItsServices)
+{
+    const std::string sample = SAMPLE_CONFIGURATION;
+    ASSERT_EQ(xmlparser::parse(sample), 0);
+    ASSERT_EQ(xmlparser::alltargets.size(), 1U);
+    EXPECT_EQ(names(xmlparser::allservices), (Names{"redis-server", "nginx"}));
+    EXPECT_EQ(names(xmlparser::alltargets[0].dependentservices), (Names{"nginx"}));
+    EXPECT_TRUE(xercecstack.empty());
+    std::ifstream file(sample);
+    const std::string text{std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>()};
+    for (const std::string name : kFields) {
+        const std::string open = "<" + name + ">";
+        const std::size_t first = text.find(open);
+        ASSERT_NE(first, std::string::npos) << name;
+        EXPECT_NE(text.find(open, first + 1), std::string::npos) << name;
+        EXPECT_EQ(text.find(open + "</"), std::string::npos) << name;
+    }
 }
 
 TEST_F(Handler, WellFormedDocumentLeavesNoElementOpen)
