@@ -1,0 +1,13 @@
+#!/usr/bin/env bash
+# Sets up, builds with warnings as errors, and runs all tests: as released, then under the address,
+# undefined-behaviour and thread sanitizers.
+set -euo pipefail
+# shellcheck source=scripts/setup.sh
+. "$(dirname "$0")/scripts/setup.sh"
+
+setup build demo test
+for preset in asan tsan release; do
+    printf '\n== %s\n' "$preset"
+    build "$preset" -DTOLKWD_WERROR=ON -DBUILD_TESTING=ON
+    (cd "$root" && ctest --preset "$preset")
+done
