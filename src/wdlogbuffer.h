@@ -39,7 +39,7 @@ public:
     std::ostream& operator<<(std::ios_base& (*manipulator)(std::ios_base&));
 
     // The buffer's stream, created on first use with the text so far. Owned by the buffer.
-    // NOLINTNEXTLINE(google-explicit-constructor): a buffer stands wherever a stream is wanted
+    // Implicit: a buffer stands wherever a stream is wanted.
     operator std::ostream&();
 
     [[nodiscard]] bool hasStream() const noexcept;

@@ -75,7 +75,7 @@ void openstandarddescriptors()
 {
     int fd = STDIN_FILENO;
     while (fd >= 0 && fd <= STDERR_FILENO) {
-        fd = open("/dev/null", O_RDWR); // NOLINT(android-cloexec-open): services inherit these
+        fd = open("/dev/null", O_RDWR); // not close-on-exec: services inherit these three
     }
     if (fd > STDERR_FILENO) {
         close(fd);
