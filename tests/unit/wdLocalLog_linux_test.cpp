@@ -1,14 +1,23 @@
 #include "wdLocalLog_linux.h"
 
 #include <algorithm>
+#include <array>
+#include <atomic>
+#include <chrono>
 #include <cstdlib>
 #include <filesystem>
+#include <iterator>
 #include <regex>
+#include <set>
 #include <sstream>
+#include <stdexcept>
+#include <string_view>
 #include <thread>
 #include <vector>
 
+#include <fcntl.h>
 #include <pthread.h>
+#include <unistd.h>
 
 #include "daemontest.h"
 #include "wdsettings.h"
@@ -32,7 +41,7 @@ protected:
     void SetUp() override
     {
         DaemonTest::SetUp();
-        setenv("TZ", "UTC", 1); // NOLINT(concurrency-mt-unsafe): one thread here
+        setenv("TZ", "UTC", 1);
         tzset();
         world.now = kMoment;
     }
@@ -73,6 +82,14 @@ TEST_F(LocalLog, OtherLevelLeavesTwoBlanks)
     EXPECT_EQ(log(), "Mon Nov 16 03:19:16 2026  m|TID" + tid() + " odd\n");
 }
 
+TEST_F(LocalLog, TimeIsLocal)
+{
+    setenv("TZ", "XYZ-5", 1);
+    tzset();
+    wdLocalLog::LogMessage("m", kLevelInfo, "x");
+    EXPECT_EQ(log().substr(0, 24), "Mon Nov 16 08:19:16 2026");
+}
+
 TEST_F(LocalLog, DayOfMonthIsPaddedAsAsctimeDoes)
 {
     world.now = kMoment - 15 * 86400L;
@@ -92,6 +109,16 @@ TEST_F(LocalLog, DebugIsDroppedUnlessEnabled)
     wdLocalLog::LogMessage("m", kLevelDebug, "x");
     EXPECT_EQ(log(), "");
     EXPECT_EQ(takestdout(), "");
+}
+
+TEST_F(LocalLog, AllButDebugIsWrittenWithoutDebug)
+{
+    debugenable = false;
+    for (const int level : {1, 0, 5, -2}) {
+        wdLocalLog::LogMessage("m", level, "level " + std::to_string(level));
+    }
+    EXPECT_EQ(world.events(), lines({"ERROR level 1", "INFO level 0", " level 5", " level -2"}));
+    EXPECT_EQ(takestdout(), log());
 }
 
 TEST_F(LocalLog, DroppedDebugStillCreatesTheFile)
@@ -136,6 +163,45 @@ TEST_F(LocalLog, DroppedDebugStillEmptiesAFileOverItsLimit)
     EXPECT_EQ(log(), "");
 }
 
+// Close-on-exec, or a service that is started meanwhile inherits the log; appending also when
+// emptied, or the lines of two threads overwrite each other.
+TEST_F(LocalLog, FileIsOpenedForAppendingAndCloseOnExec)
+{
+    world.recordopens = true;
+    const std::string opened = "open TMP/log for writing append";
+    const std::string mode = " mode " + std::to_string(0666);
+    wdLocalLog::LogMessage("m", kLevelInfo, "x");
+    EXPECT_EQ(world.events(), lines({opened + " cloexec" + mode, "INFO x"}));
+}
+
+TEST_F(LocalLog, EmptiedFileIsOpenedForAppendingAndCloseOnExecToo)
+{
+    folder.write("log", std::string(kLimitBytes, 'x') + "\n");
+    debugenable = false;
+    world.recordopens = true;
+    wdLocalLog::LogMessage("m", kLevelDebug, "x");
+    const std::string happened = world.events();
+    EXPECT_TRUE(happened.ends_with(
+        lines({"open TMP/log for writing append truncate cloexec mode " + std::to_string(0666)})));
+}
+
+std::ptrdiff_t opendescriptors()
+{
+    const std::filesystem::directory_iterator all("/proc/self/fd");
+    return std::distance(begin(all), end(all));
+}
+
+TEST_F(LocalLog, NothingStaysOpenBetweenMessages)
+{
+    const auto before = opendescriptors();
+    for (int i = 0; i < 10; ++i) {
+        wdLocalLog::LogMessage("m", kLevelInfo, "x");
+        folder.write("log", std::string(kLimitBytes + 1, 'x'));
+        wdLocalLog::LogMessage("m", kLevelInfo, "x");
+    }
+    EXPECT_EQ(opendescriptors(), before);
+}
+
 TEST_F(LocalLog, ConstructingAnotherLogRedirectsTheNextMessage)
 {
     const wdLocalLog other(folder.path("other"));
@@ -170,17 +236,26 @@ TEST_F(LocalLog, NoThreadsLineIsTornOrLost)
     for (auto& thread : threads) {
         thread.join();
     }
+    // Standard output is one file here; lines of several threads stay whole there, too.
+    std::multiset<std::string> written;
+    std::multiset<std::string> shown;
+    std::istringstream output(takestdout());
+    for (std::string line; std::getline(output, line);) {
+        shown.insert(line);
+    }
     const std::regex whole(R"(Mon Nov 16 03:19:16 2026 INFO m\|TID\d+ (\d+:\d+\.))");
     std::vector<std::string> messages;
     std::istringstream text(log());
     for (std::string line; std::getline(text, line);) {
         std::smatch match;
         ASSERT_TRUE(std::regex_match(line, match, whole)) << line;
+        written.insert(line);
         messages.push_back(match[1]);
     }
     std::sort(messages.begin(), messages.end());
     EXPECT_EQ(std::unique(messages.begin(), messages.end()), messages.end());
     EXPECT_EQ(messages.size(), kThreads * kMessages);
+    EXPECT_EQ(shown, written);
 }
 
 using LocalLogDeath = LocalLog;
@@ -205,6 +280,88 @@ TEST_F(LocalLogDeath, DroppedDebugNeedsTheFileTooAndEndsTheProcess)
     wdLocalLog::logFilePath = folder.path("missing/log");
     EXPECT_EXIT(wdLocalLog::LogMessage("m", kLevelDebug, "x"), ::testing::ExitedWithCode(200),
                 "^Unable to open the log file\n$");
+}
+
+// exit() would destroy the lists and settings that the other threads use.
+TEST_F(LocalLogDeath, NoExitHandlerRuns)
+{
+    wdLocalLog::logFilePath = folder.path("missing/log");
+    EXPECT_EXIT(
+        {
+            std::atexit([] { (void)!write(STDERR_FILENO, "an exit handler ran\n", 20); });
+            wdLocalLog::LogMessage("m", kLevelInfo, "x");
+        },
+        ::testing::ExitedWithCode(200), "^Unable to open the log file\n$");
+}
+
+// A pipe as standard error that is full until all threads have found the log gone.
+class FullPipe {
+public:
+    FullPipe()
+    {
+        if (pipe2(ends.data(), O_NONBLOCK) != 0) {
+            throw std::runtime_error("no pipe");
+        }
+        for (ssize_t put = 0; (put = write(ends[1], kFiller.data(), kFiller.size())) > 0;) {
+            filling += static_cast<std::size_t>(put);
+        }
+        fcntl(ends[1], F_SETFL, 0);
+    }
+
+    void becomestandarderror() const
+    {
+        dup2(ends[1], STDERR_FILENO);
+    }
+
+    // Takes out the filling, and nothing else.
+    void drain() const
+    {
+        std::string rest(filling, '\0');
+        for (ssize_t got = 0;
+             !rest.empty() && (got = read(ends[0], rest.data(), rest.size())) > 0;) {
+            rest.resize(rest.size() - static_cast<std::size_t>(got));
+        }
+    }
+
+    // What was written besides it.
+    [[nodiscard]] std::string text() const
+    {
+        std::array<char, 4096> block{};
+        const ssize_t got = read(ends[0], block.data(), block.size());
+        return got > 0 ? std::string(block.data(), static_cast<std::size_t>(got)) : "";
+    }
+
+private:
+    static constexpr std::string_view kFiller = "................................";
+    std::array<int, 2> ends{};
+    std::size_t filling = 0;
+};
+
+TEST_F(LocalLogDeath, OnlyTheFirstThreadSpeaks)
+{
+    FullPipe errors;
+    EXPECT_EXIT(
+        {
+            errors.becomestandarderror();
+            wdLocalLog::logFilePath = folder.path("missing/log");
+            constexpr int kThreads = 20;
+            std::atomic<int> ready = 0;
+            std::vector<std::thread> threads(kThreads);
+            for (auto& thread : threads) {
+                thread = std::thread([&ready] {
+                    ++ready;
+                    wdLocalLog::LogMessage("m", kLevelInfo, "x");
+                });
+            }
+            while (ready < kThreads) {
+                std::this_thread::yield();
+            }
+            std::this_thread::sleep_for(std::chrono::milliseconds(20)); // only sharpens the test
+            errors.drain();
+            threads.front().join();
+        },
+        ::testing::ExitedWithCode(200), "");
+    EXPECT_EQ(errors.text(), "Unable to open the log file\n");
 }
 
 TEST_F(LocalLogDeath, ManyThreadsSpeakOnceAndEndWith200)

@@ -94,10 +94,12 @@ TEST_F(CommandLineOptions, OrderDoesNotMatter)
 
 TEST_F(CommandLineOptions, RefreshPeriodBelowTwoMinutesIsThreeHours)
 {
-    const std::array<std::pair<const char*, int>, 10> cases{{
+    const std::array<std::pair<const char*, int>, 12> cases{{
         {"119", 10800},
         {"120", 120},
         {"60s", 10800},
+        {"0200", 200},
+        {"0x100", 10800},
         {"300", 300},
         {" +400x", 400},
         {"-300", 10800},
@@ -151,6 +153,14 @@ TEST_F(CommandLineOptions, NoArgumentsSetNothing)
     parse({});
     EXPECT_EQ(configPath, "");
     EXPECT_EQ(wdlocallogpath, "");
+}
+
+TEST_F(CommandLineOptions, ProgramsNameIsNoOption)
+{
+    std::string name = "-g";
+    std::array<char*, 2> words{name.data(), nullptr};
+    parseArg(1, words.data());
+    EXPECT_FALSE(debugenable);
 }
 
 TEST_F(CommandLineOptions, FindargWantsTheWholeWordInItsCase)
@@ -388,10 +398,22 @@ TEST_F(Program, ClosedStandardDescriptorsAreOpenedOnNull)
             close(STDOUT_FILENO);
             close(STDERR_FILENO);
             runmain();
-            const int next = open("/dev/null", O_RDONLY);
-            _exit(next > STDERR_FILENO ? 0 : 1);
+            const bool usable = write(STDOUT_FILENO, "x", 1) == 1 &&
+                                write(STDERR_FILENO, "x", 1) == 1 &&
+                                fcntl(STDIN_FILENO, F_GETFD) == 0;
+            _exit(usable ? 0 : 1);
         },
         ::testing::ExitedWithCode(0), "");
+}
+
+TEST_F(Program, OpenStandardDescriptorsAreLeftAloneAndNothingMoreStaysOpen)
+{
+    const int before = open("/dev/null", O_RDONLY);
+    close(before);
+    runmain();
+    const int after = open("/dev/null", O_RDONLY);
+    close(after);
+    EXPECT_EQ(after, before);
 }
 
 TEST_F(Program, InheritedDescriptorsAreKeptFromTheServices)

@@ -154,7 +154,7 @@ TEST_F(Reader, EntitiesAreNotDecoded)
 TEST_F(Reader, NulBytesAreKept)
 {
     using namespace std::string_literals;
-    EXPECT_EQ(read("<wdtargets><name>a\0b</name></wdtargets>"s)[2], "a\0b"s);
+    EXPECT_EQ(read("<wdtargets><name>\0a\0b\0</name></wdtargets>"s)[2], "\0a\0b\0"s);
 }
 
 TEST_F(Reader, EveryEndTagButTheRootsIsFollowedByItsBracketAsText)

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <cstdarg>
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
@@ -94,6 +95,7 @@ void World::reset(const std::string& folder, const std::string& module)
     now = 1'000'000'000;
     existing.clear();
     files.clear();
+    recordopens = false;
     lockinitresult = 0;
     writelockfails = false;
     threadsfail = false;
@@ -148,10 +150,10 @@ std::string lines(const std::vector<std::string>& events)
 }
 
 // The replaced functions, under the names that the linker gives them.
-// NOLINTBEGIN(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp)
 extern "C" {
 
 std::FILE* __real_fopen(const char* path, const char* mode);
+int __real_open(const char* path, int flags, ...);
 int __real_pthread_create(pthread_t* id, const pthread_attr_t* attributes, void* (*body)(void*),
                           void* argument);
 [[noreturn]] void __real_pthread_exit(void* value);
@@ -183,6 +185,24 @@ std::FILE* __wrap_fopen(const char* path, const char* mode)
     std::fwrite(found->second.data(), 1, found->second.size(), file);
     std::rewind(file);
     return file;
+}
+
+int __wrap_open(const char* path, int flags, ...)
+{
+    va_list rest;
+    va_start(rest, flags);
+    const mode_t mode = (flags & O_CREAT) != 0 ? va_arg(rest, mode_t) : 0;
+    va_end(rest);
+    auto& world = World::current();
+    if (world.recordopens) {
+        const auto flag = [flags](int bit, const char* name) {
+            return (flags & bit) == bit ? std::string(" ") + name : std::string();
+        };
+        world.record(std::string("open ") + path + flag(O_WRONLY, "for writing") +
+                     flag(O_APPEND, "append") + flag(O_TRUNC, "truncate") +
+                     flag(O_CLOEXEC, "cloexec") + " mode " + std::to_string(mode));
+    }
+    return __real_open(path, flags, mode);
 }
 
 std::FILE* __wrap_popen(const char* command, const char* mode)
@@ -314,4 +334,3 @@ std::time_t __wrap_time(std::time_t* result)
     return now;
 }
 }
-// NOLINTEND(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp)

@@ -55,6 +55,7 @@ public:
     std::set<std::string> existing;           // for access(); any other path does not exist
     std::map<std::string, std::string> files; // for fopen() of paths below /proc/
 
+    bool recordopens = false; // write open() down, with what matters of its flags
     int lockinitresult = 0;
     bool writelockfails = false; // asking for the write side takes the read side and gives EINVAL
     bool threadsfail = false;    // pthread_create gives EAGAIN and leaves rubbish in the id
