@@ -136,12 +136,6 @@ bool isconfigured(const service& svc)
     return found;
 }
 
-// A functional result that asks for no action.
-bool isfine(int functionalresult)
-{
-    return functionalresult == kAnswerCorrect || functionalresult == kFunctionalPingRefused;
-}
-
 void logretry()
 {
     wdlog(kModule, kLevelDebug,
@@ -221,6 +215,16 @@ functionalpingresult rateanswer(const std::string& answer)
         return kCommandNotFound;
     }
     return kAnswerUnclear;
+}
+
+bool isfine(int functionalresult) noexcept
+{
+    return functionalresult == kAnswerCorrect || functionalresult == kFunctionalPingRefused;
+}
+
+bool isfailure(int functionalresult) noexcept
+{
+    return functionalresult > kAnswerCorrect;
 }
 
 wdmonitorthread::wdmonitorthread(wdmonitortarget watched) : montarget(std::move(watched)) {}
@@ -448,9 +452,9 @@ void wdmonitorthread::functionalphase()
                       ", unrecognized command.");
                 break;
             }
-            if (lastping > kAnswerCorrect) {
+            if (isfailure(lastping)) {
                 lastping = retryfunctionalping();
-                if (lastping > kAnswerCorrect) {
+                if (isfailure(lastping)) {
                     functionalrecover();
                     ++recoveries;
                 }
@@ -489,7 +493,7 @@ int wdmonitorthread::retryfunctionalping()
         result = functionalping();
         --retriesleft;
         sleep(kFunctionalRetryPauseSeconds);
-    } while (result > kAnswerCorrect && retriesleft > 0);
+    } while (isfailure(result) && retriesleft > 0);
     return result;
 }
 

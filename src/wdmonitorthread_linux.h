@@ -57,6 +57,11 @@ generalpingresult ratestatus(const std::string& line, int state);
 // Rates the first line that a functional check printed. Any thread, no lock.
 functionalpingresult rateanswer(const std::string& answer);
 
+// Whether a functional result asks for nothing more, and whether it asks for retries and recovery.
+// A result below -1 is neither: the check is simply made again. Any thread, no lock.
+bool isfine(int functionalresult) noexcept;
+bool isfailure(int functionalresult) noexcept;
+
 class wdmonitorthread {
 public:
     // Keeps a copy of `watched`; the thread never looks at the manager's list again.

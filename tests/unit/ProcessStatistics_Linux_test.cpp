@@ -3,6 +3,8 @@
 #include <cerrno>
 #include <sstream>
 
+#include <fcntl.h>
+
 #include "daemontest.h"
 
 namespace {
@@ -59,6 +61,23 @@ TEST_F(UtilityTest, ExecClosesThePipeAndOpensItCloseOnExec)
     std::string output;
     Utility::exec("something", output);
     EXPECT_EQ(world.events(), lines({"popen re something", "pclose"}));
+}
+
+TEST_F(UtilityTest, ExecKeepsOfEachLineWhatStandsBeforeANulByte)
+{
+    using namespace std::string_literals;
+    commandprints({"a\0b\nc\n"s});
+    std::string output;
+    Utility::exec("binary", output);
+    EXPECT_EQ(output, "ac\n");
+}
+
+TEST_F(UtilityTest, FilesAreOpenedCloseOnExec)
+{
+    const auto file = Utility::OpenToRead(folder.write("file", "text"));
+    ASSERT_NE(file, nullptr);
+    EXPECT_NE(fcntl(fileno(file.get()), F_GETFD) & FD_CLOEXEC, 0);
+    EXPECT_EQ(Utility::OpenToRead(folder.path("missing")), nullptr);
 }
 
 TEST_F(UtilityTest, ExecReadsOnAfterAnInterruption)
@@ -309,8 +328,25 @@ TEST_F(Statistics, ClockSteppedBackGivesANegativeFigure)
     EXPECT_EQ(cpuafter(10, -5), "-2000");
 }
 
+TEST_F(Statistics, NegativeFigureIsBelowItsThreshold)
+{
+    cpuafter(10, -5);
+    world.now += 10;
+    statis(stat("0", "1", "1"));
+    EXPECT_EQ(check(), figures(-1000, 1, 1, false));
+}
+
+TEST_F(Statistics, NegativeThresholdIsReachedByZero)
+{
+    stats.SetThresholdAverageCPUUsage("-1");
+    statis(stat("0", "1", "1"));
+    EXPECT_TRUE(stats.IsThresholdReached());
+}
+
 TEST_F(Statistics, CpuArithmeticWrapsAtThirtyTwoBits)
 {
+    EXPECT_EQ(cpuafter(2147484, 2), "-1073741648");
+    stats = ProcessStatistics("web");
     EXPECT_EQ(cpuafter(2147484, 1), "-2147483296");
 }
 
@@ -331,6 +367,16 @@ TEST_F(Statistics, TwoChecksInOneSecondKeepTheFigure)
     cpuafter(5, 10);
     EXPECT_EQ(check(),
               "DEBUG Refresh called twice in zero time interval\n" + figures(500, 1, 1, false));
+}
+
+TEST_F(Statistics, SecondCheckInOneSecondMovesTheBaseline)
+{
+    cpuafter(5, 10);
+    statis(stat("105", "1", "1"));
+    check();
+    statis(stat("106", "1", "1"));
+    world.now += 10;
+    EXPECT_EQ(check(), figures(100, 1, 1, false));
 }
 
 TEST_F(Statistics, UnsetThresholdsAreReachedByAnyLiveProcess)

@@ -504,6 +504,17 @@ TEST_F(MonitorThread, NonNumericIntervalIsNoPause)
                               kExit}));
 }
 
+TEST_F(MonitorThread, IntervalsAreDecimal)
+{
+    web.genpinginterval = "010s";
+    stopafter(1, 10);
+    EXPECT_EQ(run(), inorder({kEntry,
+                              kGoodPing,
+                              kNoFunctionalPing,
+                              {"DEBUG General ping sleep 10", "sleep 10"},
+                              kExit}));
+}
+
 TEST_F(MonitorThread, NegativeIntervalIsNoPause)
 {
     web.genpinginterval = "-5";
@@ -640,6 +651,82 @@ TEST_F(FunctionalPhase, RefusedPingIsNoFailure)
                      }));
 }
 
+TEST_F(FunctionalPhase, EmptyCommandIsACommand)
+{
+    web.functionalpingcmd = "";
+    const std::string happened = run();
+    EXPECT_NE(
+        happened.find("\nrun  1>TMP/agent.functionalping.web 2>TMP/agent.functionalping.web\n"),
+        std::string::npos);
+}
+
+// A refused ping (result -1) among the retries ends them, and nothing is recovered.
+TEST_F(FunctionalPhase, RefusedRetryEndsTheRetriesWithoutRecovery)
+{
+    checks = {kException};
+    std::optional<LockHeld> held;
+    world.onsleep = [&](unsigned seconds) {
+        if (seconds == 30) {
+            held.emplace();
+        } else if (seconds == kFunctionalInterval) {
+            held.reset();
+            globalenable = 0;
+        }
+    };
+    EXPECT_EQ(run(), inorder({kEntry, kGoodPing, kPass, kExceptionCheck, kFirstFunctionalFailure,
+                              functionalretry({}), kFunctionalSleep, kGeneralSleep, kExit}));
+}
+
+TEST_F(FunctionalPhase, RefusedPingAfterARecoveryCountsAsRecovered)
+{
+    checks = {kException};
+    std::optional<LockHeld> held;
+    world.onsleep = [&, phases = 0](unsigned seconds) mutable {
+        if (seconds == kFunctionalInterval) {
+            if (++phases == 1) {
+                held.emplace();
+            } else {
+                held.reset();
+                globalenable = 0;
+            }
+        }
+    };
+    EXPECT_EQ(run(), inorder({kEntry,
+                              kGoodPing,
+                              kPass,
+                              kExceptionCheck,
+                              kFirstFunctionalFailure,
+                              times(3, functionalretry(kExceptionCheck)),
+                              kFunctionalRecovery,
+                              kFunctionalSleep,
+                              kPass,
+                              kFunctionalSleep,
+                              {"INFO Functional ping failed for service web, but this service has "
+                               "been successfully functional recovered."},
+                              kGeneralSleep,
+                              kExit}));
+}
+
+TEST(FunctionalResults, BelowMinusOneAreNeitherFineNorAFailure)
+{
+    for (const int result : {-2, -3, -100}) {
+        EXPECT_FALSE(isfine(result)) << result;
+        EXPECT_FALSE(isfailure(result)) << result;
+    }
+}
+
+TEST(FunctionalResults, MinusOneAndZeroAreFineAndAllAboveAreFailures)
+{
+    for (const int result : {-1, 0}) {
+        EXPECT_TRUE(isfine(result)) << result;
+        EXPECT_FALSE(isfailure(result)) << result;
+    }
+    for (const int result : {1, 2, 3, 4}) {
+        EXPECT_FALSE(isfine(result)) << result;
+        EXPECT_TRUE(isfailure(result)) << result;
+    }
+}
+
 class Skipping : public FunctionalPhase {
 protected:
     void SetUp() override
@@ -774,10 +861,48 @@ TEST_F(Skipping, GoneProcessGoesOnBeingJudgedByItsLastFigures)
     EXPECT_NE(happened.find(kUnable), std::string::npos);
 }
 
+TEST_F(Skipping, AskingAloneNeverEndsARunOfSkips)
+{
+    // As the thread's start would do.
+    web.statistics.SetThresholdThreadCount(web.ThresholdThreadCount);
+    web.statistics.SetThresholdMemoryUsage(web.ThresholdMemoryUsage);
+    wdmonitorthread thread(watched);
+    EXPECT_FALSE(thread.IsPingable());
+    EXPECT_FALSE(thread.IsPingable());
+    threadsare(1);
+    EXPECT_TRUE(thread.IsPingable()); // idle
+    threadsare(51);
+    EXPECT_FALSE(thread.IsPingable()); // the third skip
+    EXPECT_TRUE(thread.IsPingable());  // the limit, and it stays
+    EXPECT_TRUE(thread.IsPingable());
+}
+
+TEST_F(Skipping, ThreadStartsItsCountAfresh)
+{
+    wdmonitorthread thread(watched);
+    EXPECT_FALSE(thread.IsPingable());
+    EXPECT_FALSE(thread.IsPingable());
+    EXPECT_NE(runbody(&thread).find(" Skipping functional ping. 1 FPs skipped so far."),
+              std::string::npos);
+}
+
 TEST_F(Skipping, FunctionalPingEndsARunOfSkipsWhateverItsResult)
 {
-    for (const bool refused : {false, true}) {
+    struct Case {
+        const char* command;
+        Reply reply;
+        bool refused;
+        int result;
+    };
+    const std::vector<Case> cases{
+        {"check-web", kCorrect, false, 0}, {"check-web", kException, false, 1},
+        {"check-web", kMissing, false, 2}, {"check-web", kSilent, false, 3},
+        {"check-web", kCorrect, true, -1}, {"NULL", kCorrect, false, -1},
+    };
+    for (const auto& [command, reply, refused, result] : cases) {
+        web.functionalpingcmd = command;
         web.MaxFPSkips = "2";
+        checks = {reply};
         wdmonitorthread thread(watched);
         EXPECT_FALSE(thread.IsPingable());
         EXPECT_FALSE(thread.IsPingable());
@@ -787,7 +912,7 @@ TEST_F(Skipping, FunctionalPingEndsARunOfSkipsWhateverItsResult)
             if (refused) {
                 held.emplace();
             }
-            EXPECT_EQ(thread.functionalping(), refused ? -1 : 0);
+            EXPECT_EQ(thread.functionalping(), result);
         }
         EXPECT_FALSE(thread.IsPingable());
         EXPECT_FALSE(thread.IsPingable());
@@ -821,8 +946,8 @@ TEST_F(GeneralPing, CapitalsAreWordsOfTheirOwn)
 {
     EXPECT_EQ(rate("RUNNING"), 0);
     EXPECT_EQ(rate("NOT RUNNING"), 1);
-    EXPECT_EQ(rate("not RUNNING"), 0);
-    EXPECT_EQ(rate("NOT running"), 0);
+    EXPECT_EQ(rate("not RUNNING", 1), 0);
+    EXPECT_EQ(rate("NOT running", 1), 0);
 }
 
 TEST_F(GeneralPing, CapitalisedRunningCountsOnlyByExitStatus)
@@ -834,6 +959,19 @@ TEST_F(GeneralPing, CapitalisedRunningCountsOnlyByExitStatus)
 TEST_F(GeneralPing, RunningComesBeforeStopped)
 {
     EXPECT_EQ(rate("running, was stopped"), 0);
+}
+
+TEST_F(GeneralPing, NotAloneSaysNothing)
+{
+    EXPECT_EQ(rate("web does not say", 0), 0);
+    EXPECT_EQ(rate("web does not say", 1), 3);
+    EXPECT_EQ(rate("WEB DOES NOT SAY", 1), 3);
+}
+
+TEST_F(GeneralPing, StoppedComesBeforeUnknown)
+{
+    EXPECT_EQ(rate("stopped: unrecognized service"), 1);
+    EXPECT_EQ(rate("not running: no such service"), 1);
 }
 
 TEST_F(GeneralPing, UnusedIsNotRunning)
@@ -924,6 +1062,13 @@ TEST_F(GeneralPing, RefusedLockRunsNothing)
     EXPECT_EQ(world.events(), lines({kRefusedPing}));
 }
 
+TEST_F(GeneralPing, LockIsReleasedAfterTheRating)
+{
+    world.recordthreads = true;
+    wdmonitorthread(watched).generalping(web);
+    EXPECT_EQ(world.events(), inorder({kGoodPing, {"release lock"}}));
+}
+
 TEST_F(GeneralPing, LockIsHeldForReadingWhileTheCommandRunsAndFreeAfterwards)
 {
     world.onsystem = [this](const std::string& command) {
@@ -977,11 +1122,14 @@ TEST_F(FunctionalPing, NotDoesNotSpoilTheOtherMarks)
 TEST_F(FunctionalPing, ExceptionIsAFailure)
 {
     EXPECT_EQ(rate("CIMException: x"), 1);
+    EXPECT_EQ(rate("CIMExcept"), 3);
 }
 
 TEST_F(FunctionalPing, SuccessComesBeforeException)
 {
     EXPECT_EQ(rate("CIMException in service: web"), 0);
+    EXPECT_EQ(rate("CIMException while running"), 0);
+    EXPECT_EQ(rate("CIMException, initialized"), 0);
 }
 
 TEST_F(FunctionalPing, ExceptionComesBeforeMissingCommand)
@@ -1002,6 +1150,8 @@ TEST_F(FunctionalPing, AnythingElseIsAFailure)
     EXPECT_EQ(rate(""), 3);
     EXPECT_EQ(rate("ok"), 3);
     EXPECT_EQ(rate("Running"), 3);
+    EXPECT_EQ(rate("service up"), 3);
+    EXPECT_EQ(rate("InstanceID 4"), 3);
 }
 
 TEST_F(FunctionalPing, OnlyTheFirstLineCounts)
@@ -1040,6 +1190,13 @@ TEST_F(FunctionalPing, RefusedLockIsSilent)
     const LockHeld held;
     EXPECT_EQ(wdmonitorthread(watched).functionalping(), -1);
     EXPECT_EQ(world.events(), "");
+}
+
+TEST_F(FunctionalPing, LockIsReleasedAfterTheRating)
+{
+    world.recordthreads = true;
+    wdmonitorthread(watched).functionalping();
+    EXPECT_EQ(world.events(), inorder({kGoodCheck, {"release lock"}}));
 }
 
 TEST_F(FunctionalPing, LockIsHeldForReadingWhileTheCommandRunsAndFreeAfterwards)
@@ -1116,6 +1273,32 @@ TEST_F(GeneralRecovery, ConfiguredStopWithDefaultStart)
                                    kStartOfWeb,
                                    kNoDependentsToStart,
                                    kRecoveryEnds}));
+}
+
+TEST_F(GeneralRecovery, OnlyTheWholeWordMeansNoCommand)
+{
+    web.stopcmd = "";
+    web.startcmd = "NULLIFY";
+    adddependent("a", "null", "");
+    debugenable = false;
+    EXPECT_EQ(recover(3), lines({"ERROR Try the general recover for service web", "run ",
+                                 "run null", "run NULLIFY", "run "}));
+}
+
+TEST_F(GeneralRecovery, SimilarNamesAreOtherServices)
+{
+    debugenable = false;
+    xmlparser::allservices[0].name = "web2";
+    EXPECT_EQ(recover(1), lines({"ERROR Try the general recover for service web", kNotFound}));
+}
+
+TEST_F(GeneralRecovery, LockIsTakenAndReleasedBetweenItsMessages)
+{
+    world.recordthreads = true;
+    Events expected = kRecoveryOfStopped;
+    expected.insert(expected.begin() + 1, "take lock for writing");
+    expected.insert(expected.end() - 1, "release lock");
+    EXPECT_EQ(recover(1), lines(expected));
 }
 
 TEST_F(GeneralRecovery, OneDependentWithDefaultCommands)
@@ -1236,18 +1419,20 @@ TEST_F(RecoveryWithoutLock, WhatIsDownIsNotStoppedAndWhatRunsIsNotStarted)
     status["a"] = {kStopped, kRunning};
     status["web"] = {kRunning};
     EXPECT_EQ(recover(3),
-              lines({"ERROR Try the general recover for service web", "run service web stop",
-                     statusof("a"), statusof("web"), statusof("a"), "release lock"}));
+              lines({"take lock for writing", "ERROR Try the general recover for service web",
+                     "run service web stop", statusof("a"), statusof("web"), statusof("a"),
+                     "release lock"}));
 }
 
 TEST_F(RecoveryWithoutLock, WhatRunsIsStoppedAndWhatIsDownIsStarted)
 {
     status["a"] = {kRunning, kStopped};
     status["web"] = {kStopped};
-    EXPECT_EQ(recover(3),
-              lines({"ERROR Try the general recover for service web", "run service web stop",
-                     statusof("a"), "run service a stop", statusof("web"), "run service web start",
-                     statusof("a"), "run service a start", "release lock"}));
+    EXPECT_EQ(
+        recover(3),
+        lines({"take lock for writing", "ERROR Try the general recover for service web",
+               "run service web stop", statusof("a"), "run service a stop", statusof("web"),
+               "run service web start", statusof("a"), "run service a start", "release lock"}));
 }
 
 TEST_F(GeneralRecovery, FunctionalRecoveryIsAWholeRecoveryAndASecond)

@@ -302,7 +302,11 @@ int __wrap_pthread_rwlock_unlock(pthread_rwlock_t* lock)
 
 int __wrap_pthread_rwlock_wrlock(pthread_rwlock_t* lock)
 {
-    if (World::current().writelockfails) {
+    auto& world = World::current();
+    if (world.recordthreads) {
+        world.record("take lock for writing");
+    }
+    if (world.writelockfails) {
         pthread_rwlock_rdlock(lock);
         return EINVAL;
     }
