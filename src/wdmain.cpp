@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <csignal>
 #include <cstdlib>
 #include <iostream>
 #include <memory>
@@ -98,6 +99,13 @@ void sealotherdescriptors()
     }
 }
 
+// Whoever started the daemon may have left SIGCHLD ignored. The result of every command would then
+// be lost, and services that run would be taken for failing.
+void waitforcommands()
+{
+    (void)std::signal(SIGCHLD, SIG_DFL); // cannot fail: the signal exists
+}
+
 } // namespace
 
 int isInstalledNX()
@@ -167,6 +175,7 @@ int main(int argc, char** argv)
 {
     openstandarddescriptors();
     sealotherdescriptors();
+    waitforcommands();
     if (isInstalledNX() == 0) {
         wd_postpone();
         [[maybe_unused]] const int ignored = std::system(kSetMarker); // the next start waits again

@@ -4,6 +4,7 @@
 #include "wdmain.h"
 
 #include <array>
+#include <csignal>
 #include <initializer_list>
 #include <utility>
 
@@ -414,6 +415,18 @@ TEST_F(Program, OpenStandardDescriptorsAreLeftAloneAndNothingMoreStaysOpen)
     const int after = open("/dev/null", O_RDONLY);
     close(after);
     EXPECT_EQ(after, before);
+}
+
+// Or every command's result would be lost.
+TEST_F(Program, IgnoredChildrenAreWaitedForAgain)
+{
+    EXPECT_EXIT(
+        {
+            std::signal(SIGCHLD, SIG_IGN);
+            runmain();
+            _exit(std::signal(SIGCHLD, SIG_DFL) == SIG_DFL ? 0 : 1);
+        },
+        ::testing::ExitedWithCode(0), "");
 }
 
 TEST_F(Program, InheritedDescriptorsAreKeptFromTheServices)
