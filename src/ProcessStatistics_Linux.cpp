@@ -1,6 +1,5 @@
 #include "ProcessStatistics_Linux.h"
 
-#include <array>
 #include <cerrno>
 #include <cstdint>
 #include <ctime>
@@ -13,7 +12,8 @@ namespace {
 
 constexpr const char* kModule = "ProcessStatistics";
 
-constexpr std::size_t kExecBufferBytes = 128;
+// What a command prints is taken in pieces: a line, or so many characters of a longer one.
+constexpr std::size_t kPieceCharacters = 127;
 
 // Places of the figures in /proc/PID/stat, counted from 0.
 constexpr std::size_t kUserTimeField = 13;
@@ -31,6 +31,32 @@ int ticksperkilosecond(int fromTicks, int toTicks, int fromTime, int toTime)
     const auto ticks = static_cast<std::int32_t>(difference(fromTicks, toTicks) * 1000U);
     const auto seconds = static_cast<std::int32_t>(difference(fromTime, toTime));
     return static_cast<std::int32_t>(std::int64_t{ticks} / seconds);
+}
+
+// All that the pipe delivers, of each piece what stands before a NUL byte. Reads on after an
+// interruption and stops at any other error. Not fgets: when it is interrupted, what it has read of
+// the piece is lost.
+std::string readpieces(std::FILE* pipe)
+{
+    std::string text;
+    std::string piece;
+    for (;;) {
+        const int c = std::getc(pipe);
+        if (c == EOF && std::ferror(pipe) != 0 && errno == EINTR) {
+            std::clearerr(pipe);
+            continue;
+        }
+        if (c != EOF) {
+            piece += static_cast<char>(c);
+        }
+        if (c == EOF || c == '\n' || piece.size() == kPieceCharacters) {
+            text.append(piece, 0, piece.find('\0'));
+            piece.clear();
+        }
+        if (c == EOF) {
+            return text;
+        }
+    }
 }
 
 // A byte of value 0xFF ends the reading like the end of the file does. It is narrowed to a signed
@@ -54,18 +80,7 @@ int Utility::exec(std::string command, std::string& output)
     if (pipe == nullptr) {
         return 1;
     }
-    output.clear();
-    std::array<char, kExecBufferBytes> buffer{};
-    while (std::feof(pipe) == 0) {
-        if (std::fgets(buffer.data(), static_cast<int>(buffer.size()), pipe) != nullptr) {
-            output += buffer.data();
-        } else if (std::ferror(pipe) != 0) {
-            if (errno != EINTR) {
-                break;
-            }
-            std::clearerr(pipe);
-        }
-    }
+    output = readpieces(pipe);
     pclose(pipe);
     return 0;
 }

@@ -1,9 +1,15 @@
 #include "ProcessStatistics_Linux.h"
 
 #include <cerrno>
+#include <chrono>
+#include <csignal>
+#include <filesystem>
 #include <sstream>
+#include <thread>
 
 #include <fcntl.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
 #include "daemontest.h"
 
@@ -82,7 +88,7 @@ TEST_F(UtilityTest, FilesAreOpenedCloseOnExec)
 
 TEST_F(UtilityTest, ExecReadsOnAfterAnInterruption)
 {
-    commandprints({std::string("one\n"), EINTR, std::string("two\n")});
+    commandprints({std::string("one\ntw"), EINTR, std::string("o\n"), EINTR});
     std::string output;
     EXPECT_EQ(Utility::exec("interrupted", output), 0);
     EXPECT_EQ(output, "one\ntwo\n");
@@ -90,10 +96,10 @@ TEST_F(UtilityTest, ExecReadsOnAfterAnInterruption)
 
 TEST_F(UtilityTest, ExecStopsAtAReadError)
 {
-    commandprints({std::string("one\n"), EIO, std::string("two\n")});
+    commandprints({std::string("one\ntw"), EIO, std::string("o\n")});
     std::string output;
     EXPECT_EQ(Utility::exec("broken", output), 0);
-    EXPECT_EQ(output, "one\n");
+    EXPECT_EQ(output, "one\ntw");
     EXPECT_EQ(world.events(), lines({"popen re broken", "pclose"}));
 }
 
@@ -150,6 +156,82 @@ TEST_F(UtilityTest, Str2intOfANumberBeyondIntIsTheNearest)
 {
     EXPECT_EQ(Utility::str2int("99999999999"), 2147483647);
     EXPECT_EQ(Utility::str2int("-99999999999"), -2147483647 - 1);
+}
+
+// With a real shell behind popen.
+class UtilityWithShell : public UtilityTest {
+protected:
+    void SetUp() override
+    {
+        UtilityTest::SetUp();
+        world.realpopen = true;
+    }
+
+    static std::string outputof(const std::string& command)
+    {
+        std::string output = "old";
+        EXPECT_EQ(Utility::exec(command, output), 0);
+        return output;
+    }
+};
+
+TEST_F(UtilityWithShell, OnlyStandardOutputIsCollected)
+{
+    EXPECT_EQ(outputof("echo out; exec 2>/dev/null; echo err >&2; exit 3"), "out\n");
+    EXPECT_EQ(outputof("true"), "");
+    EXPECT_EQ(outputof("/no/such/program 2>/dev/null"), "");
+    EXPECT_EQ(outputof("/no/such/program 2>&1").find("old"), std::string::npos);
+}
+
+TEST_F(UtilityWithShell, LongLinesAreCollectedWhole)
+{
+    EXPECT_EQ(outputof("printf '%0300d\\n' 7"), std::string(299, '0') + "7\n");
+}
+
+// A process of the test's own, running a program of this path.
+class Probe {
+public:
+    explicit Probe(const std::string& path) : id(fork())
+    {
+        if (id == 0) {
+            execl(path.c_str(), path.c_str(), "300", nullptr);
+            _exit(127);
+        }
+    }
+    ~Probe()
+    {
+        kill(id, SIGKILL);
+        waitpid(id, nullptr, 0);
+    }
+    Probe(const Probe&) = delete;
+    Probe& operator=(const Probe&) = delete;
+
+    [[nodiscard]] std::string text() const
+    {
+        return std::to_string(id) + "\n";
+    }
+
+private:
+    pid_t id;
+};
+
+TEST_F(UtilityWithShell, PidofFindsAProgramByItsPathAndElseByItsName)
+{
+    const std::string name = "tolkwd" + std::to_string(getpid() % 1000);
+    std::filesystem::copy_file("/bin/sleep", folder.path(name));
+    EXPECT_EQ(Utility::pidof(folder.path(name)), "");
+    {
+        const Probe probe(folder.path(name));
+        const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+        while (Utility::pidof(folder.path(name)).empty() &&
+               std::chrono::steady_clock::now() < deadline) {
+            std::this_thread::yield(); // until it has become that program
+        }
+        EXPECT_EQ(Utility::pidof(folder.path(name)), probe.text());
+        EXPECT_EQ(Utility::pidof(name), probe.text());
+        EXPECT_EQ(Utility::pidof("/no/such/folder/" + name), probe.text());
+    }
+    EXPECT_EQ(Utility::pidof(name), "");
 }
 
 using Pieces = std::vector<std::string>;
@@ -338,9 +420,16 @@ TEST_F(Statistics, NegativeFigureIsBelowItsThreshold)
 
 TEST_F(Statistics, NegativeThresholdIsReachedByZero)
 {
-    stats.SetThresholdAverageCPUUsage("-1");
-    statis(stat("0", "1", "1"));
-    EXPECT_TRUE(stats.IsThresholdReached());
+    statis(stat("0", "0", "0"));
+    EXPECT_FALSE(stats.IsThresholdReached());
+    for (const auto setter : {&ProcessStatistics::SetThresholdAverageCPUUsage,
+                              &ProcessStatistics::SetThresholdThreadCount,
+                              &ProcessStatistics::SetThresholdMemoryUsage}) {
+        (stats.*setter)("-1");
+        EXPECT_TRUE(stats.IsThresholdReached());
+        (stats.*setter)("0");
+        EXPECT_FALSE(stats.IsThresholdReached());
+    }
 }
 
 TEST_F(Statistics, CpuArithmeticWrapsAtThirtyTwoBits)
@@ -406,6 +495,14 @@ TEST_F(Statistics, FirstOfSeveralProcessesCounts)
     };
     statis(stat("0", "1", "1"));
     EXPECT_EQ(check(), changed + figures(0, 1, 1, false));
+}
+
+TEST_F(Statistics, LongProcessIdsAreReadWhole)
+{
+    processis(4194304);
+    world.files["/proc/4194304/stat"] = stat("0", "1", "1");
+    EXPECT_EQ(check(),
+              "DEBUG (web) PID changed (old = -1, new = 4194304)\n" + figures(0, 1, 1, false));
 }
 
 TEST_F(Statistics, GoneProcessIsReportedEachTimeAndTheLastFiguresDecide)

@@ -3,6 +3,7 @@
 
 #include "wdmonitorthread_linux.h"
 
+#include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <deque>
@@ -336,6 +337,13 @@ protected:
 
 using MonitorThread = Monitor;
 
+const int kEnabledAtStart = globalenable;
+
+TEST_F(MonitorThread, MonitoringIsDisabledUntilTheManagerEnablesIt)
+{
+    EXPECT_EQ(kEnabledAtStart, 0);
+}
+
 TEST_F(MonitorThread, HealthyServiceIsOnePingACycle)
 {
     stopafter(2, kGeneralInterval);
@@ -484,11 +492,14 @@ TEST_F(MonitorThread, NoAllowedRecoveryMeansNoPingAtAll)
 TEST_F(MonitorThread, NegativeAllowanceCyclesWithoutPingOrPauseUntilDisabled)
 {
     web.maxattemptofwakeup = "-1";
-    std::thread manager([] {
+    std::atomic<bool> disabled = false;
+    std::thread manager([&] {
         std::this_thread::sleep_for(std::chrono::milliseconds(5));
+        disabled = true;
         std::atomic_ref(globalenable).store(0);
     });
     const std::string happened = run();
+    EXPECT_TRUE(disabled);
     manager.join();
     EXPECT_EQ(happened, inorder({kEntry, kExit}));
 }
@@ -649,6 +660,31 @@ TEST_F(FunctionalPhase, RefusedPingIsNoFailure)
                          "sleep 7",
                          "returns 0",
                      }));
+}
+
+TEST_F(FunctionalPhase, DisabledMonitoringDoesNotCutThePhaseShort)
+{
+    checks = {kSilent};
+    world.onsleep = [](unsigned) {
+        globalenable = 0;
+    };
+    EXPECT_EQ(run(), inorder({kEntry, kGoodPing,
+                              times(2, kPass + kSilentCheck + kFirstFunctionalFailure +
+                                           times(3, functionalretry(kSilentCheck)) +
+                                           kFunctionalRecovery + kFunctionalSleep),
+                              kFunctionallyGaveUp}));
+}
+
+TEST_F(FunctionalPhase, IntervalBeyondSleepIsTheLongestPause)
+{
+    web.funpinginterval = "99999999999";
+    EXPECT_EQ(run(), inorder({kEntry,
+                              kGoodPing,
+                              kPass,
+                              kGoodCheck,
+                              {"DEBUG Functional ping sleep 99999999999", "sleep 4294967295"},
+                              kGeneralSleep,
+                              kExit}));
 }
 
 TEST_F(FunctionalPhase, EmptyCommandIsACommand)
@@ -1062,11 +1098,13 @@ TEST_F(GeneralPing, RefusedLockRunsNothing)
     EXPECT_EQ(world.events(), lines({kRefusedPing}));
 }
 
-TEST_F(GeneralPing, LockIsReleasedAfterTheRating)
+TEST_F(GeneralPing, LockIsTakenAfterItsFirstMessageAndReleasedAfterTheLast)
 {
     world.recordthreads = true;
     wdmonitorthread(watched).generalping(web);
-    EXPECT_EQ(world.events(), inorder({kGoodPing, {"release lock"}}));
+    Events expected = kGoodPing + Events{"release lock"};
+    expected.insert(expected.begin() + 1, "take lock for reading");
+    EXPECT_EQ(world.events(), lines(expected));
 }
 
 TEST_F(GeneralPing, LockIsHeldForReadingWhileTheCommandRunsAndFreeAfterwards)
@@ -1192,11 +1230,11 @@ TEST_F(FunctionalPing, RefusedLockIsSilent)
     EXPECT_EQ(world.events(), "");
 }
 
-TEST_F(FunctionalPing, LockIsReleasedAfterTheRating)
+TEST_F(FunctionalPing, LockIsTakenBeforeAndReleasedAfterItsMessages)
 {
     world.recordthreads = true;
     wdmonitorthread(watched).functionalping();
-    EXPECT_EQ(world.events(), inorder({kGoodCheck, {"release lock"}}));
+    EXPECT_EQ(world.events(), inorder({{"take lock for reading"}, kGoodCheck, {"release lock"}}));
 }
 
 TEST_F(FunctionalPing, LockIsHeldForReadingWhileTheCommandRunsAndFreeAfterwards)
@@ -1207,6 +1245,37 @@ TEST_F(FunctionalPing, LockIsHeldForReadingWhileTheCommandRunsAndFreeAfterwards)
     };
     wdmonitorthread(watched).functionalping();
     EXPECT_TRUE(lockisfree());
+}
+
+// A ping waits for the recovery of another thread; it is not refused.
+TEST_F(GeneralPing, WaitsWhileAnotherThreadHoldsTheLockForWriting)
+{
+    std::atomic<bool> pinged = false;
+    world.onsystem = [&](const std::string& command) {
+        pinged = true;
+        return answer(command);
+    };
+    std::optional<LockHeld> held(std::in_place);
+    std::thread pinging([this] { EXPECT_EQ(wdmonitorthread(watched).generalping(web), 0); });
+    while (world.events().find(kRefusedPing) == std::string::npos) {
+        std::this_thread::yield();
+    }
+    std::this_thread::sleep_for(std::chrono::milliseconds(5)); // only sharpens the test
+    EXPECT_FALSE(pinged);
+    held.reset();
+    pinging.join();
+    EXPECT_TRUE(pinged);
+}
+
+TEST_F(GeneralPing, MissingFolderIsLeftToTheShellsExitStatus)
+{
+    _tmp_file_path = folder.path("missing/");
+    world.onsystem = [](const std::string& command) {
+        return runforreal(command + " 2>/dev/null");
+    };
+    EXPECT_EQ(wdmonitorthread(watched).generalping(web), 3);
+    EXPECT_NE(world.events().find("DEBUG Unable to open service status file.\n"),
+              std::string::npos);
 }
 
 class GeneralRecovery : public Monitor {
@@ -1297,6 +1366,8 @@ TEST_F(GeneralRecovery, LockIsTakenAndReleasedBetweenItsMessages)
     world.recordthreads = true;
     Events expected = kRecoveryOfStopped;
     expected.insert(expected.begin() + 1, "take lock for writing");
+    const auto ping = std::find(expected.begin(), expected.end(), kRefusedPing);
+    expected.insert(ping + 1, "take lock for reading");
     expected.insert(expected.end() - 1, "release lock");
     EXPECT_EQ(recover(1), lines(expected));
 }
@@ -1410,7 +1481,8 @@ protected:
 
     static std::string statusof(const std::string& name)
     {
-        return "run service " + name + " status 1>TMP/agent." + name + " 2>TMP/agent." + name;
+        return "take lock for reading\nrun service " + name + " status 1>TMP/agent." + name +
+               " 2>TMP/agent." + name;
     }
 };
 
@@ -1437,6 +1509,9 @@ TEST_F(RecoveryWithoutLock, WhatRunsIsStoppedAndWhatIsDownIsStarted)
 
 TEST_F(GeneralRecovery, FunctionalRecoveryIsAWholeRecoveryAndASecond)
 {
+    world.onsystem = [](const std::string&) {
+        return exited(1);
+    }; // nothing helps
     EXPECT_EQ(wdmonitorthread(watched).functionalrecover(), 1);
     EXPECT_EQ(world.events(), lines(kFunctionalRecovery));
 }

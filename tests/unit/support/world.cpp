@@ -92,6 +92,7 @@ void World::reset(const std::string& folder, const std::string& module)
     onpopen = [](const std::string&) {
         return Output{};
     };
+    realpopen = false;
     now = 1'000'000'000;
     existing.clear();
     files.clear();
@@ -153,6 +154,9 @@ std::string lines(const std::vector<std::string>& events)
 extern "C" {
 
 std::FILE* __real_fopen(const char* path, const char* mode);
+int __real_pclose(std::FILE* stream);
+std::FILE* __real_popen(const char* command, const char* mode);
+int __real_system(const char* command);
 int __real_open(const char* path, int flags, ...);
 int __real_pthread_create(pthread_t* id, const pthread_attr_t* attributes, void* (*body)(void*),
                           void* argument);
@@ -160,6 +164,7 @@ int __real_pthread_create(pthread_t* id, const pthread_attr_t* attributes, void*
 int __real_pthread_join(pthread_t id, void** value);
 int __real_pthread_rwlock_destroy(pthread_rwlock_t* lock);
 int __real_pthread_rwlock_init(pthread_rwlock_t* lock, const pthread_rwlockattr_t* attributes);
+int __real_pthread_rwlock_rdlock(pthread_rwlock_t* lock);
 int __real_pthread_rwlock_unlock(pthread_rwlock_t* lock);
 int __real_pthread_rwlock_wrlock(pthread_rwlock_t* lock);
 
@@ -209,6 +214,9 @@ std::FILE* __wrap_popen(const char* command, const char* mode)
 {
     auto& world = World::current();
     world.record(std::string("popen ") + mode + " " + command);
+    if (world.realpopen) {
+        return __real_popen(command, mode);
+    }
     auto output = world.onpopen(command);
     if (!output) {
         return nullptr;
@@ -219,8 +227,9 @@ std::FILE* __wrap_popen(const char* command, const char* mode)
 
 int __wrap_pclose(std::FILE* stream)
 {
-    World::current().record("pclose");
-    return std::fclose(stream);
+    auto& world = World::current();
+    world.record("pclose");
+    return world.realpopen ? __real_pclose(stream) : std::fclose(stream);
 }
 
 int __wrap_pthread_create(pthread_t* id, const pthread_attr_t* attributes, void* (*body)(void*),
@@ -289,6 +298,15 @@ int __wrap_pthread_rwlock_destroy(pthread_rwlock_t* lock)
     return __real_pthread_rwlock_destroy(lock);
 }
 
+int __wrap_pthread_rwlock_rdlock(pthread_rwlock_t* lock)
+{
+    auto& world = World::current();
+    if (world.recordthreads) {
+        world.record("take lock for reading");
+    }
+    return __real_pthread_rwlock_rdlock(lock);
+}
+
 int __wrap_pthread_rwlock_unlock(pthread_rwlock_t* lock)
 {
     auto& world = World::current();
@@ -307,7 +325,7 @@ int __wrap_pthread_rwlock_wrlock(pthread_rwlock_t* lock)
         world.record("take lock for writing");
     }
     if (world.writelockfails) {
-        pthread_rwlock_rdlock(lock);
+        __real_pthread_rwlock_rdlock(lock);
         return EINVAL;
     }
     return __real_pthread_rwlock_wrlock(lock);
@@ -337,4 +355,9 @@ std::time_t __wrap_time(std::time_t* result)
     }
     return now;
 }
+}
+
+int runforreal(const std::string& command)
+{
+    return __real_system(command.c_str());
 }

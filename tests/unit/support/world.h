@@ -51,6 +51,8 @@ public:
     // What a command that popen() starts prints; nothing: it cannot be started.
     std::function<std::optional<Output>(const std::string&)> onpopen;
 
+    bool realpopen = false; // popen() asks the system after all
+
     std::atomic<std::time_t> now = 0;         // what time() gives
     std::set<std::string> existing;           // for access(); any other path does not exist
     std::map<std::string, std::string> files; // for fopen() of paths below /proc/
@@ -72,6 +74,9 @@ private:
     std::size_t logread = 0;
     std::vector<std::string> happened;
 };
+
+// Runs a command in a real shell and returns its wait status.
+int runforreal(const std::string& command);
 
 // A command that ended with this exit status, as system() reports it.
 int exited(int status);
