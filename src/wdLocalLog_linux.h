@@ -1,7 +1,7 @@
 // The local log: one line per event, to the log file and, the same line, to standard output.
 //
 // The file is opened, appended to and closed for every message, so an operator can move or remove
-// it at any time, and it is emptied once it has grown past kLogLimitBytes. A log file that cannot
+// it at any time, and it is emptied once it has grown past 1023999 bytes. A log file that cannot
 // be opened ends the process: a watchdog that nobody can hear is no watchdog.
 #pragma once
 
@@ -27,5 +27,7 @@ public:
     // line on standard error. Any thread; takes no lock.
     static void LogMessage(std::string module, int level, std::string message);
 
+    // Where the messages go. Set by the constructor; read by every thread, so change it only while
+    // no other thread logs.
     static std::string logFilePath;
 };

@@ -1,10 +1,5 @@
 #include "wdlogbuffer.h"
 
-WDLogBuffer::~WDLogBuffer()
-{
-    delete stream;
-}
-
 WDLogBuffer& WDLogBuffer::operator<<(const char* piece)
 {
     if (piece == nullptr) {
@@ -36,7 +31,7 @@ WDLogBuffer& WDLogBuffer::operator<<(const std::string& piece)
 WDLogBuffer& WDLogBuffer::operator<<(char piece)
 {
     if (stream != nullptr) {
-        // From here on `text` is only scratch; the message itself is in the stream.
+        // The message is in the stream; `text` is free to make a string of the character.
         text = piece;
         *stream << text;
     } else {
@@ -103,7 +98,7 @@ std::ostream& WDLogBuffer::operator<<(std::ios_base& (*manipulator)(std::ios_bas
 WDLogBuffer::operator std::ostream&()
 {
     if (stream == nullptr) {
-        stream = new std::ostringstream;
+        stream = std::make_unique<std::ostringstream>();
         if (!text.empty()) {
             *stream << text;
         }

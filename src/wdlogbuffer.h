@@ -6,6 +6,7 @@
 // Most callers want wdlog() at the end of this file: composing and writing in one expression.
 #pragma once
 
+#include <memory>
 #include <sstream>
 #include <string>
 
@@ -15,7 +16,7 @@
 class WDLogBuffer {
 public:
     WDLogBuffer() = default;
-    ~WDLogBuffer();
+    ~WDLogBuffer() = default;
     WDLogBuffer(const WDLogBuffer&) = delete;
     WDLogBuffer& operator=(const WDLogBuffer&) = delete;
 
@@ -50,8 +51,8 @@ public:
     std::string& str(std::ostream& chainEnd);
 
 private:
-    std::string text;                     // the message, until there is a stream; then scratch
-    std::ostringstream* stream = nullptr; // once there, every insertion goes here
+    std::string text; // the message, until there is a stream; then scratch
+    std::unique_ptr<std::ostringstream> stream; // once there, every insertion goes here
 };
 
 // Composes `pieces` and writes them as one line; `level` is one of loglevel. Any thread; behaves

@@ -101,7 +101,7 @@ void sealotherdescriptors()
 
 // Whoever started the daemon may have left SIGCHLD ignored. The result of every command would then
 // be lost, and services that run would be taken for failing.
-void waitforcommands()
+void restorechildsignal()
 {
     (void)std::signal(SIGCHLD, SIG_DFL); // cannot fail: the signal exists
 }
@@ -175,10 +175,11 @@ int main(int argc, char** argv)
 {
     openstandarddescriptors();
     sealotherdescriptors();
-    waitforcommands();
+    restorechildsignal();
     if (isInstalledNX() == 0) {
         wd_postpone();
-        [[maybe_unused]] const int ignored = std::system(kSetMarker); // the next start waits again
+        // If it fails, the next start waits again.
+        [[maybe_unused]] const int ignored = std::system(kSetMarker);
     }
     parseArg(argc, argv);
     checkParsed();

@@ -16,6 +16,8 @@ namespace {
 constexpr const char* kModule = "wdmanager";
 constexpr unsigned kTickSeconds = 1;
 
+void* const kNoLock = reinterpret_cast<void*>(1); // NOLINT(performance-no-int-to-ptr): exit value
+
 void enablemonitoring(bool enable)
 {
     std::atomic_ref(globalenable).store(enable ? 1 : 0);
@@ -91,14 +93,15 @@ void wdmanager::startgeneration()
     }
     if (pthread_rwlock_init(&pingreclock, nullptr) != 0) {
         wdlog(kModule, kLevelError, "Failed to init the pingreclock.");
-        pthread_exit(reinterpret_cast<void*>(1)); // NOLINT(performance-no-int-to-ptr): exit value
+        pthread_exit(kNoLock);
     }
     for (wdmonitorthread& thread : threads) {
         thread.create();
     }
 }
 
-// Each thread ends at the top of its next cycle, which may be a whole interval away.
+// Each thread ends at the top of its next cycle; until then its intervals, retries and a recovery
+// may pass.
 void wdmanager::stopgeneration()
 {
     enablemonitoring(false);

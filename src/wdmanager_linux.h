@@ -48,5 +48,5 @@ private:
     std::vector<wdmonitorthread> threads;
 
     wdLocalLog* locallog = nullptr; // only made to set the path; never deleted
-    std::string logpath;
+    std::string logpath;            // like configfile, what this manager was started with
 };

@@ -10,6 +10,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include "ProcessStatistics_Linux.h"
 #include "wdlogbuffer.h"
 #include "wdsettings.h"
 #include "xmlparser.h"
@@ -48,28 +49,19 @@ public:
     readguard(const readguard&) = delete;
     readguard& operator=(const readguard&) = delete;
 
-    [[nodiscard]] bool held() const noexcept
-    {
-        return granted;
-    }
+    [[nodiscard]] bool held() const noexcept { return granted; }
 
 private:
     pthread_rwlock_t& lock;
     const bool granted;
 };
 
-// Holds the lock for writing. A recovery that is needed goes on even where the lock refuses, so
-// the refusal is not looked at, and the release is made in any case.
+// Holds the lock for writing. The lock refuses only a thread that holds it already; a recovery goes
+// on then, and the release is that thread's own. So the refusal is not looked at.
 class writeguard {
 public:
-    explicit writeguard(pthread_rwlock_t& guarded) : lock(guarded)
-    {
-        pthread_rwlock_wrlock(&lock);
-    }
-    ~writeguard()
-    {
-        pthread_rwlock_unlock(&lock);
-    }
+    explicit writeguard(pthread_rwlock_t& guarded) : lock(guarded) { pthread_rwlock_wrlock(&lock); }
+    ~writeguard() { pthread_rwlock_unlock(&lock); }
     writeguard(const writeguard&) = delete;
     writeguard& operator=(const writeguard&) = delete;
 
@@ -105,7 +97,7 @@ int runforstate(const std::string& command)
     return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
 }
 
-// Whether a stop or start worked, only the next ping shows.
+// Its exit status is not looked at: what it printed or the next ping shows whether it worked.
 void runforeffect(const std::string& command)
 {
     [[maybe_unused]] const int ignored = std::system(command.c_str());
@@ -136,7 +128,7 @@ bool isconfigured(const service& svc)
     return found;
 }
 
-void logretry()
+void announceretry()
 {
     wdlog(kModule, kLevelDebug,
           "Retry the general ping before we take action to recover, sleeping for 60 seconds now");
@@ -386,24 +378,14 @@ void wdmonitorthread::monitorcycle()
         } else {
             lastping = retrygeneralping();
             if (lastping != kServiceRunning) {
-                logretry(); // announced once more, though no pause follows
+                announceretry(); // once more, though neither a pause nor a retry follows
                 generalrecover(lastping);
                 ++recoveries;
             }
         }
-        const long interval = number(svc.genpinginterval);
-        wdlog(kModule, kLevelDebug, "General ping sleep ", interval);
-        pausefor(interval);
+        pausegeneral();
     }
-    if (recoveries > 0 && lastping == kServiceRunning) {
-        wdlog(kModule, kLevelInfo, "General ping failed for service ", svc.name,
-              ", but this service has been general recoverred successfully.");
-    }
-    if (recoveries == maxrecoveries() && lastping != kServiceRunning) {
-        wdlog(kModule, kLevelError, "Failed to general recover the sevice ", svc.name,
-              " after try the max times.");
-        pthread_exit(kGaveUp);
-    }
+    concludegeneral(recoveries, lastping);
 }
 
 // Returns the last retry's result. The retry message follows each ping, the last and a successful
@@ -422,9 +404,31 @@ int wdmonitorthread::retrygeneralping()
         result = generalping(svc);
         --retriesleft;
         wdlog(kModule, kLevelDebug, "General ping will be tried ", retriesleft, " more time(s)");
-        logretry();
+        announceretry();
     } while (result != kServiceRunning && retriesleft > 0);
     return result;
+}
+
+void wdmonitorthread::pausegeneral() const
+{
+    const long interval = number(montarget.monitoredservice.genpinginterval);
+    wdlog(kModule, kLevelDebug, "General ping sleep ", interval);
+    pausefor(interval);
+}
+
+// Reports the end of an outage, or gives up and ends the thread.
+void wdmonitorthread::concludegeneral(int recoveries, int lastping) const
+{
+    const service& svc = montarget.monitoredservice;
+    if (recoveries > 0 && lastping == kServiceRunning) {
+        wdlog(kModule, kLevelInfo, "General ping failed for service ", svc.name,
+              ", but this service has been general recoverred successfully.");
+    }
+    if (recoveries == maxrecoveries() && lastping != kServiceRunning) {
+        wdlog(kModule, kLevelError, "Failed to general recover the sevice ", svc.name,
+              " after try the max times.");
+        pthread_exit(kGaveUp);
+    }
 }
 
 // Passes until a functional ping is fine or skipped, its command is not found, or the recoveries
@@ -440,40 +444,35 @@ void wdmonitorthread::functionalphase()
     int lastping = kNoFunctionalPingYet;
     int recoveries = 0;
     while (recoveries < maxrecoveries() && !isfine(lastping)) {
-        if (!IsPingable()) {
-            wdlog(kModule, kLevelInfo, "(", svc.binarypath, ") Skipping functional ping. ",
-                  fpskipcount, " FPs skipped so far.");
-            lastping = kAnswerCorrect;
-        } else {
-            wdlog(kModule, kLevelInfo, "(", svc.binarypath, ") Executing functional ping now ... ");
-            lastping = functionalping();
-            if (lastping == kCommandNotFound) {
-                wdlog(kModule, kLevelError, "Functionalping failed for service ", svc.name,
-                      ", unrecognized command.");
-                break;
-            }
+        lastping = skiporping();
+        if (lastping == kCommandNotFound) {
+            wdlog(kModule, kLevelError, "Functionalping failed for service ", svc.name,
+                  ", unrecognized command.");
+            break;
+        }
+        if (isfailure(lastping)) {
+            lastping = retryfunctionalping();
             if (isfailure(lastping)) {
-                lastping = retryfunctionalping();
-                if (isfailure(lastping)) {
-                    functionalrecover();
-                    ++recoveries;
-                }
+                functionalrecover();
+                ++recoveries;
             }
         }
-        const long interval = number(svc.funpinginterval);
-        wdlog(kModule, kLevelDebug, "Functional ping sleep ", interval);
-        pausefor(interval);
+        pausefunctional();
     }
-    if (recoveries > 0 && isfine(lastping)) {
-        wdlog(kModule, kLevelInfo, "Functional ping failed for service ", svc.name,
-              ", but this service has been successfully functional recovered.");
+    concludefunctional(recoveries, lastping);
+}
+
+// The functional ping's result; a skipped one counts as a correct answer.
+int wdmonitorthread::skiporping()
+{
+    const service& svc = montarget.monitoredservice;
+    if (!IsPingable()) {
+        wdlog(kModule, kLevelInfo, "(", svc.binarypath, ") Skipping functional ping. ", fpskipcount,
+              " FPs skipped so far.");
+        return kAnswerCorrect;
     }
-    if (recoveries == maxrecoveries() && !isfine(lastping)) {
-        // The wording is older than the daemon's silence: no indication is sent anywhere.
-        wdlog(kModule, kLevelError, "Failed to functional recover the sevice ", svc.name,
-              " after try the max times. Will log and send indication to Kelmora Server");
-        pthread_exit(kGaveUp);
-    }
+    wdlog(kModule, kLevelInfo, "(", svc.binarypath, ") Executing functional ping now ... ");
+    return functionalping();
 }
 
 // Returns the last retry's result. The message announces 10 seconds and the pause is 60; and here
@@ -495,6 +494,29 @@ int wdmonitorthread::retryfunctionalping()
         sleep(kFunctionalRetryPauseSeconds);
     } while (isfailure(result) && retriesleft > 0);
     return result;
+}
+
+void wdmonitorthread::pausefunctional() const
+{
+    const long interval = number(montarget.monitoredservice.funpinginterval);
+    wdlog(kModule, kLevelDebug, "Functional ping sleep ", interval);
+    pausefor(interval);
+}
+
+// Reports the end of a failure, or gives up and ends the thread.
+void wdmonitorthread::concludefunctional(int recoveries, int lastping) const
+{
+    const service& svc = montarget.monitoredservice;
+    if (recoveries > 0 && isfine(lastping)) {
+        wdlog(kModule, kLevelInfo, "Functional ping failed for service ", svc.name,
+              ", but this service has been successfully functional recovered.");
+    }
+    if (recoveries == maxrecoveries() && !isfine(lastping)) {
+        // The wording is older than the daemon's silence: no indication is sent anywhere.
+        wdlog(kModule, kLevelError, "Failed to functional recover the sevice ", svc.name,
+              " after try the max times. Will log and send indication to Kelmora Server");
+        pthread_exit(kGaveUp);
+    }
 }
 
 void wdmonitorthread::stopmonitored() const

@@ -2,11 +2,12 @@
 //
 // The cycle. Each turn makes one general ping (`service NAME status`). While the service runs, the
 // functional phase follows (the configured check command), then the general interval, then the next
-// turn. A general ping that fails is tried again: after 30 s, then three times with 60 s before
-// each. If all fail, the service is recovered: stopped, its dependents stopped, all started again
-// in that order. A functional ping that fails is tried again after 30 s, up to three times with 60
-// s behind each, and then recovered in the same way. After maxattemptofwakeup recoveries without a
-// good ping the thread gives up and ends; the manager's next refresh starts a fresh one.
+// turn. A general ping that fails is followed by a pause of 30 s and up to three retries, with a
+// pause of 60 s before each. If all fail, the service is recovered: stopped, its dependents
+// stopped, all started again in that order. A functional ping that fails is followed by a pause of
+// 30 s and up to three retries, with a pause of 60 s behind each, and then by such a recovery.
+// After maxattemptofwakeup recoveries without a good ping the thread gives up and ends; the
+// manager's next refresh starts a fresh one.
 //
 // The end. A thread looks at `globalenable` at the top of each cycle only; from there to the next
 // top there can be a whole interval, the retries and a recovery. It also ends, through
@@ -16,7 +17,7 @@
 // The lock. Pings hold `pingreclock` for reading while their command runs, a recovery holds it for
 // writing from its first command to its last: no ping runs anywhere while a recovery is under way.
 // A recovery pings too, from within. The lock refuses such a request of its own writer at once, the
-// ping counts as "not known", and so a recovery stops and starts everything it has.
+// ping gives kGeneralPingRefused, and so a recovery stops and starts everything it has.
 #pragma once
 
 #include <string>
@@ -58,7 +59,8 @@ generalpingresult ratestatus(const std::string& line, int state);
 functionalpingresult rateanswer(const std::string& answer);
 
 // Whether a functional result asks for nothing more, and whether it asks for retries and recovery.
-// A result below -1 is neither: the check is simply made again. Any thread, no lock.
+// Anything below -1, such as the phase's own "no ping yet", is neither: the next pass decides. Any
+// thread, no lock.
 bool isfine(int functionalresult) noexcept;
 bool isfailure(int functionalresult) noexcept;
 
@@ -99,15 +101,20 @@ public:
     int functionalrecover();
 
     // Whether the functional ping may run now. False while the process is over its thresholds, but
-    // at most MaxFPSkips times in a row. Counts the skips. Takes no lock.
+    // at most MaxFPSkips times in a row (negative: without bound). Counts the skips. Takes no lock.
     bool IsPingable();
 
 private:
     void announce();
     void monitorcycle();
     int retrygeneralping();
+    void pausegeneral() const;
+    void concludegeneral(int recoveries, int lastping) const;
     void functionalphase();
+    int skiporping();
     int retryfunctionalping();
+    void pausefunctional() const;
+    void concludefunctional(int recoveries, int lastping) const;
     void stopmonitored() const;
     void stopdependents();
     void startmonitored();

@@ -8,7 +8,8 @@
 //   empty elements  An element without text stores the last text token before it, which nearly
 //                   always is the ">" that the reader delivers behind an end tag.
 //   unknown names   An element of another name, a comment included, stays open for ever. Inside a
-//                   target it loses that target; between targets it is harmless.
+//                   target it loses that target; between targets it is harmless. One with a "/" in
+//                   it comes as an end tag instead and closes whatever is open.
 //
 // Everything here runs on the manager's thread, called by xmlparser::parse; it takes no lock and
 // raises nothing of its own. The state outlives a parse and is reset by nobody.

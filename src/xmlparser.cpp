@@ -6,6 +6,7 @@
 #include <stdexcept>
 #include <string_view>
 
+#include "ProcessStatistics_Linux.h"
 #include "wdxmlparserhandler.h"
 
 const char control[20] = {'\n', '\r', '\t', ' '};
@@ -84,8 +85,10 @@ private:
         if (text.substr(cur, 2) != "<?") {
             return;
         }
+        // Without any further "?", the text goes on at the declaration's first one.
+        constexpr std::size_t kWithoutMark = 1;
         const std::size_t mark = text.find('?', kInsideDeclaration);
-        const std::size_t behind = mark == npos ? 1 : mark + kDeclarationEndBytes;
+        const std::size_t behind = mark == npos ? kWithoutMark : mark + kDeclarationEndBytes;
         if (behind >= cur) {
             pos = behind;
         }

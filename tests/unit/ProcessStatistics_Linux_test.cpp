@@ -206,10 +206,7 @@ public:
     Probe(const Probe&) = delete;
     Probe& operator=(const Probe&) = delete;
 
-    [[nodiscard]] std::string text() const
-    {
-        return std::to_string(id) + "\n";
-    }
+    [[nodiscard]] std::string text() const { return std::to_string(id) + "\n"; }
 
 private:
     pid_t id;
@@ -294,10 +291,7 @@ protected:
         };
     }
 
-    void statis(const std::string& content)
-    {
-        world.files["/proc/42/stat"] = content;
-    }
+    void statis(const std::string& content) { world.files["/proc/42/stat"] = content; }
 
     // The log of one check, and its result.
     std::string check()

@@ -30,10 +30,7 @@ class LocalLog : public DaemonTest {
 protected:
     LocalLog() : DaemonTest("m") {}
 
-    std::string log()
-    {
-        return folder.read("log");
-    }
+    std::string log() { return folder.read("log"); }
 
     // 2026-11-16 03:19:16 UTC, a Monday.
     static constexpr std::time_t kMoment = 1794799156;
@@ -46,10 +43,7 @@ protected:
         world.now = kMoment;
     }
 
-    static std::string tid()
-    {
-        return std::to_string(pthread_self());
-    }
+    static std::string tid() { return std::to_string(pthread_self()); }
 };
 
 TEST_F(LocalLog, LineHasTimeLevelModuleThreadAndMessage)
@@ -308,10 +302,7 @@ public:
         fcntl(ends[1], F_SETFL, 0);
     }
 
-    void becomestandarderror() const
-    {
-        dup2(ends[1], STDERR_FILENO);
-    }
+    void becomestandarderror() const { dup2(ends[1], STDERR_FILENO); }
 
     // Takes out the filling, and nothing else.
     void drain() const

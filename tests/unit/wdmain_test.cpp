@@ -35,14 +35,8 @@ public:
         pointers.push_back(nullptr);
     }
 
-    [[nodiscard]] int argc() const
-    {
-        return static_cast<int>(texts.size());
-    }
-    char** argv()
-    {
-        return pointers.data();
-    }
+    [[nodiscard]] int argc() const { return static_cast<int>(texts.size()); }
+    char** argv() { return pointers.data(); }
 
 private:
     std::vector<std::string> texts;

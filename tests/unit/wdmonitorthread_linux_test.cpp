@@ -213,14 +213,8 @@ const Events kFunctionallyGaveUp{
 // Holds the lock for writing on this thread, which makes it refuse this thread's pings.
 class LockHeld {
 public:
-    LockHeld()
-    {
-        pthread_rwlock_wrlock(&pingreclock);
-    }
-    ~LockHeld()
-    {
-        pthread_rwlock_unlock(&pingreclock);
-    }
+    LockHeld() { pthread_rwlock_wrlock(&pingreclock); }
+    ~LockHeld() { pthread_rwlock_unlock(&pingreclock); }
     LockHeld(const LockHeld&) = delete;
     LockHeld& operator=(const LockHeld&) = delete;
 };

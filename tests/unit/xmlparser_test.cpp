@@ -43,10 +43,7 @@ using Tokens = std::vector<std::string>;
 
 class Reader : public ::testing::Test {
 protected:
-    void SetUp() override
-    {
-        tokens.clear();
-    }
+    void SetUp() override { tokens.clear(); }
 
     // The tokens of a file that holds `text`.
     Tokens read(std::string_view text)

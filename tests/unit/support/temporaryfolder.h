@@ -27,16 +27,10 @@ public:
     TemporaryFolder& operator=(const TemporaryFolder&) = delete;
 
     // The folder itself, with trailing slash.
-    [[nodiscard]] const std::string& path() const
-    {
-        return name;
-    }
+    [[nodiscard]] const std::string& path() const { return name; }
 
     // The path of a file in it.
-    [[nodiscard]] std::string path(const std::string& file) const
-    {
-        return name + file;
-    }
+    [[nodiscard]] std::string path(const std::string& file) const { return name + file; }
 
     std::string write(const std::string& file, std::string_view content) const
     {
