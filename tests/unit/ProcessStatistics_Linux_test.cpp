@@ -103,15 +103,6 @@ TEST_F(UtilityTest, ExecStopsAtAReadError)
     EXPECT_EQ(world.events(), lines({"popen re broken", "pclose"}));
 }
 
-TEST_F(UtilityTest, ExecOfAMissingProgramIsStillZero)
-{
-    // The shell starts, complains on standard error and prints nothing.
-    commandprints({});
-    std::string output;
-    EXPECT_EQ(Utility::exec("/no/such/program", output), 0);
-    EXPECT_EQ(output, "");
-}
-
 TEST_F(UtilityTest, PidofReturnsTheTextAsItStands)
 {
     commandprints({std::string("12 7\n")});
@@ -214,7 +205,7 @@ private:
 
 TEST_F(UtilityWithShell, PidofFindsAProgramByItsPathAndElseByItsName)
 {
-    const std::string name = "tolkwd" + std::to_string(getpid() % 1000);
+    const std::string name = "tolk" + std::to_string(getpid()); // 15 characters at the most
     std::filesystem::copy_file("/bin/sleep", folder.path(name));
     EXPECT_EQ(Utility::pidof(folder.path(name)), "");
     {

@@ -302,6 +302,14 @@ public:
         fcntl(ends[1], F_SETFL, 0);
     }
 
+    ~FullPipe()
+    {
+        close(ends[0]);
+        close(ends[1]);
+    }
+    FullPipe(const FullPipe&) = delete;
+    FullPipe& operator=(const FullPipe&) = delete;
+
     void becomestandarderror() const { dup2(ends[1], STDERR_FILENO); }
 
     // Takes out the filling, and nothing else.

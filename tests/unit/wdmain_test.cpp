@@ -9,6 +9,7 @@
 #include <utility>
 
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "daemontest.h"
@@ -260,6 +261,21 @@ TEST_F(Installation, PingFolderIsFixed)
     EXPECT_EQ(_tmp_file_path, "/opt/varden/tolk/bin/");
 }
 
+// What tells a file from all others.
+using FileIdentity = std::pair<dev_t, ino_t>;
+
+FileIdentity fileof(int fd)
+{
+    struct stat status {};
+    return fstat(fd, &status) == 0 ? FileIdentity{status.st_dev, status.st_ino} : FileIdentity{};
+}
+
+FileIdentity fileof(const char* path)
+{
+    struct stat status {};
+    return stat(path, &status) == 0 ? FileIdentity{status.st_dev, status.st_ino} : FileIdentity{};
+}
+
 class Program : public Startup {
 protected:
     void SetUp() override
@@ -396,19 +412,28 @@ TEST_F(Program, ClosedStandardDescriptorsAreOpenedOnNull)
             const bool usable = write(STDOUT_FILENO, "x", 1) == 1 &&
                                 write(STDERR_FILENO, "x", 1) == 1 &&
                                 fcntl(STDIN_FILENO, F_GETFD) == 0;
-            _exit(usable ? 0 : 1);
+            _exit(usable && fileof(STDIN_FILENO) == fileof("/dev/null") &&
+                          fileof(STDOUT_FILENO) == fileof("/dev/null") &&
+                          fileof(STDERR_FILENO) == fileof("/dev/null")
+                      ? 0
+                      : 1);
         },
         ::testing::ExitedWithCode(0), "");
 }
 
 TEST_F(Program, OpenStandardDescriptorsAreLeftAloneAndNothingMoreStaysOpen)
 {
+    const auto files = [] {
+        return std::array{fileof(STDIN_FILENO), fileof(STDOUT_FILENO), fileof(STDERR_FILENO)};
+    };
+    const auto filesbefore = files();
     const int before = open("/dev/null", O_RDONLY);
     close(before);
     runmain();
     const int after = open("/dev/null", O_RDONLY);
     close(after);
     EXPECT_EQ(after, before);
+    EXPECT_EQ(files(), filesbefore);
 }
 
 // Or every command's result would be lost.

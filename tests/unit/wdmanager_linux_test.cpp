@@ -141,15 +141,16 @@ TEST_F(Manager, TwoGenerationsWithAChangedConfigurationBetween)
                                 lines({"destroy lock", "sleep 1", "stopped by the test"}));
 }
 
-TEST_F(Manager, MonitoringIsDisabledBeforeTheJoinsAndEnabledBeforeTheStarts)
+TEST_F(Manager, MonitoringIsEnabledWhenThreadsStartAndDisabledWhenTheyAreJoined)
 {
-    std::vector<int> enabled;
-    world.onsleep = [&](unsigned) {
-        enabled.push_back(globalenable);
+    std::string calls;
+    world.onthread = [&](const std::string& call) {
+        calls += call + (globalenable != 0 ? " enabled\n" : " disabled\n");
     };
-    supervise(6);
-    // At the ticks before, after and after the first start, and before and after the second.
-    EXPECT_EQ(enabled, (std::vector<int>{1, 1, 1, 0, 1}));
+    configure({"web"});
+    supervise(7);
+    const std::string generation = "create thread enabled\njoin thread disabled\n";
+    EXPECT_EQ(calls, generation + generation);
 }
 
 TEST_F(Manager, ConfigurationWithoutTargetsStartsNothingAndRefreshesAllTheSame)

@@ -4,8 +4,6 @@
 
 #include <gtest/gtest.h>
 
-#include "wdxmlparserhandler.h"
-
 namespace {
 
 constexpr std::array<std::string service::*, 16> kTexts{
@@ -42,14 +40,6 @@ TEST(Records, CommandNeverGivenIsEmptyNotNull)
     EXPECT_EQ(fresh.functionalpingcmd, "");
 }
 
-TEST(Records, NonNumericIntervalStaysText)
-{
-    service odd;
-    odd.genpinginterval = "abc";
-    const service copy = odd;
-    EXPECT_EQ(copy.genpinginterval, "abc");
-}
-
 TEST(Records, CopyCarriesEveryTextAndTheStatistics)
 {
     service original;
@@ -62,14 +52,6 @@ TEST(Records, CopyCarriesEveryTextAndTheStatistics)
         EXPECT_EQ(copy.*kTexts.at(i), "value " + std::to_string(i));
     }
     EXPECT_EQ(copy.statistics.GetThresholdThreadCount(), 12);
-}
-
-TEST(Records, EmptyNamesDenoteTheSameService)
-{
-    service commanded;
-    commanded.startcmd = "something";
-    std::vector<service> known{service{}};
-    EXPECT_EQ(addservice(commanded, known), 0);
 }
 
 TEST(Records, DefaultTargetHasNoDependents)

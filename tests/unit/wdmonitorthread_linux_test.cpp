@@ -1573,17 +1573,18 @@ TEST_F(Threads, WorksOnACopyOfItsTarget)
     EXPECT_EQ(runbody(&thread), inorder({kEntry, kExit}));
 }
 
-// Two services fail at once, in threads of their own: while one is being recovered, nothing else
-// is pinged or recovered.
+// Two threads recover and two ping, all at once: while one recovers, nothing else is pinged or
+// recovered.
 TEST_F(Monitor, RecoveriesExcludePingsAndEachOther)
 {
-    constexpr int kRecoveries = 20;
+    constexpr int kTurns = 20;
     std::atomic<int> recovering = 0;
     std::atomic<int> pinging = 0;
+    std::atomic<int> pings = 0;
     std::atomic<bool> overlap = false;
-    std::atomic<bool> enough = false;
     world.onsystem = [&](const std::string& command) {
         const bool isping = command.find(" status ") != std::string::npos;
+        pings += isping ? 1 : 0;
         std::atomic<int>& mine = isping ? pinging : recovering;
         ++mine;
         for (int i = 0; i < 20; ++i) {
@@ -1599,14 +1600,13 @@ TEST_F(Monitor, RecoveriesExcludePingsAndEachOther)
     for (int i = 0; i < 2; ++i) {
         threads.emplace_back([&] {
             wdmonitorthread thread(watched);
-            for (int n = 0; n < kRecoveries; ++n) {
+            for (int n = 0; n < kTurns; ++n) {
                 thread.generalrecover(3);
             }
-            enough = true;
         });
         threads.emplace_back([&] {
             wdmonitorthread thread(watched);
-            while (!enough) {
+            for (int n = 0; n < kTurns; ++n) {
                 thread.generalping(web);
             }
         });
@@ -1614,6 +1614,7 @@ TEST_F(Monitor, RecoveriesExcludePingsAndEachOther)
     for (auto& thread : threads) {
         thread.join();
     }
+    EXPECT_EQ(pings, 2 * kTurns);
     EXPECT_FALSE(overlap);
 }
 

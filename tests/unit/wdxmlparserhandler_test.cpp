@@ -373,6 +373,40 @@ TEST_F(Handler, AddserviceKeepsTheFirstOfAName)
     EXPECT_EQ(services[0].startcmd, "one");
 }
 
+TEST_F(Handler, EmptyNamesDenoteTheSameService)
+{
+    std::vector<service> services{service{}};
+    service commanded;
+    commanded.startcmd = "something";
+    EXPECT_EQ(addservice(commanded, services), 0);
+    EXPECT_EQ(services[0].startcmd, "");
+}
+
+TEST_F(Handler, ValuesAreKeptAsTextWhateverTheySay)
+{
+    load(document(targetof(monitored(element("genpinginterval", "abc")))));
+    EXPECT_EQ(xmlparser::alltargets[0].monitoredservice.genpinginterval, "abc");
+}
+
+TEST_F(Handler, CommandNeverGivenIsEmptyNotNull)
+{
+    load(document(targetof(monitored(element("name", "a")))));
+    EXPECT_EQ(xmlparser::alltargets[0].monitoredservice.functionalpingcmd, "");
+    EXPECT_NE(xmlparser::alltargets[0].monitoredservice.functionalpingcmd, kNoCommand);
+}
+
+// An end tag for the reader: the service ends there, and the service's end tag ends the target.
+TEST_F(Handler, CommentWithASlashEndsTheServiceEarly)
+{
+    load(document(targetof(monitored(element("name", "good") + element("startcmd", "start-good"))) +
+                  targetof(monitored(element("name", "web") + "<!-- see /etc/web -->\n" +
+                                     element("startcmd", "start-web")) +
+                           dependent(element("name", "d")))));
+    ASSERT_EQ(targetnames(), (Names{"good", "web"}));
+    EXPECT_EQ(xmlparser::alltargets[1].monitoredservice.startcmd, "start-good");
+    EXPECT_TRUE(xmlparser::alltargets[1].dependentservices.empty());
+}
+
 TEST_F(Handler, EndOfDocumentRebuildsTheServices)
 {
     xmlparser::allservices.resize(3);

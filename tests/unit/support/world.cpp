@@ -89,6 +89,8 @@ void World::reset(const std::string& folder, const std::string& module)
     onsystem = [](const std::string&) {
         return 0;
     };
+    onthread = [](const std::string&) {
+    };
     onpopen = [](const std::string&) {
         return Output{};
     };
@@ -236,6 +238,7 @@ int __wrap_pthread_create(pthread_t* id, const pthread_attr_t* attributes, void*
                           void* argument)
 {
     auto& world = World::current();
+    world.onthread("create thread");
     if (world.recordthreads) {
         world.record("create thread");
     }
@@ -254,6 +257,7 @@ int __wrap_pthread_create(pthread_t* id, const pthread_attr_t* attributes, void*
 int __wrap_pthread_join(pthread_t id, void** value)
 {
     auto& world = World::current();
+    world.onthread("join thread");
     if (world.recordthreads) {
         world.record("join thread");
     }

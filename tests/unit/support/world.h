@@ -58,6 +58,7 @@ public:
     std::map<std::string, std::string> files; // for fopen() of paths below /proc/
 
     bool recordopens = false; // write open() down, with what matters of its flags
+    std::function<void(const std::string&)> onthread; // called for each thread call
     int lockinitresult = 0;
     bool writelockfails = false; // asking for the write side takes the read side and gives EINVAL
     bool threadsfail = false;    // pthread_create gives EAGAIN and leaves rubbish in the id
