@@ -80,7 +80,8 @@ TEST_F(UtilityTest, ExecKeepsOfEachLineWhatStandsBeforeANulByte)
 
 TEST_F(UtilityTest, FilesAreOpenedCloseOnExec)
 {
-    const auto file = Utility::OpenToRead(folder.write("file", "text"));
+    folder.write("file", "text");
+    const auto file = Utility::OpenToRead(folder.path("file"));
     ASSERT_NE(file, nullptr);
     EXPECT_NE(fcntl(fileno(file.get()), F_GETFD) & FD_CLOEXEC, 0);
     EXPECT_EQ(Utility::OpenToRead(folder.path("missing")), nullptr);

@@ -32,10 +32,10 @@ public:
     // The path of a file in it.
     [[nodiscard]] std::string path(const std::string& file) const { return name + file; }
 
-    std::string write(const std::string& file, std::string_view content) const
+    // Makes or replaces a file in it.
+    void write(const std::string& file, std::string_view content) const
     {
         std::ofstream(path(file), std::ios::binary) << content;
-        return path(file);
     }
 
     [[nodiscard]] std::string read(const std::string& file) const
