@@ -23,19 +23,33 @@ case "${1-}" in
         ;;
 esac
 
+# A clone that root has built in cannot be built in by others.
+[ ! -d "$root/build" ] || [ -w "$root/build" ] || fail "$root/build is not yours: remove it as root"
+
 if [ $# -eq 0 ]; then
     setup build demo
     build release -DBUILD_TESTING=OFF
     exec "$root/scripts/demo/run.sh" "$root/build/release/src/tolkwd"
 fi
 
-setup build
+# The daemon judges its arguments itself; this only keeps a slip from setting up a machine.
+case " $* " in
+    *" -i "*" -l "* | *" -l "*" -i "*) ;;
+    *)
+        usage >&2
+        exit 2
+        ;;
+esac
+
+# Standard output belongs to the daemon's log.
+setup build >&2
 build release -DBUILD_TESTING=OFF >&2
 # The daemon expects the folder of its pings' output; without it every ping would fail.
 if [ ! -d /opt/varden/tolk/bin ]; then
     as_root mkdir -p /opt/varden/tolk/bin
     printf 'made /opt/varden/tolk/bin for the output of the pings\n' >&2
 fi
+as_root true # fails here, with its reason, where there is no way to become root
 if [ "$(id -u)" -eq 0 ]; then
     exec "$root/build/release/src/tolkwd" "$@"
 fi

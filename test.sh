@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
-# Sets up, builds with warnings as errors, and runs all tests: as released, then under the address,
-# undefined-behaviour and thread sanitizers.
+# Sets up, builds with warnings as errors, and runs all tests: under the address and undefined-
+# behaviour sanitizers, under the thread sanitizer, and as released.
 set -euo pipefail
 # shellcheck source=scripts/setup.sh
 . "$(dirname "$0")/scripts/setup.sh"

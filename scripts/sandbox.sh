@@ -12,6 +12,10 @@ while [ $# -gt 0 ] && [ "$1" != -- ]; do
     options+=("$1")
     shift
 done
+if [ $# -lt 2 ]; then
+    printf 'usage: sandbox.sh [BWRAP-OPTION...] -- COMMAND...\n' >&2
+    exit 2
+fi
 shift
 
 as_root=()

@@ -29,35 +29,53 @@ missing_packages() {
     done <"$root/scripts/packages.txt"
 }
 
-# Installs packages without starting their services, now or at the next boot: the demonstration
-# runs them in its sandbox only.
-install_quietly() {
-    local guard=/usr/sbin/policy-rc.d guarded=no service
-    if [ ! -e "$guard" ]; then
-        guarded=yes
-        printf '#!/bin/sh\nexit 101\n' | as_root tee "$guard" >/dev/null
-        as_root chmod 755 "$guard"
-        trap 'as_root rm -f /usr/sbin/policy-rc.d' EXIT
+# Services that the demonstration alone needs. Where its packages bring them, they are neither
+# started nor enabled at boot; where the machine had them before, they are left as they are.
+readonly demo_services=(nginx redis-server)
+readonly guard=/usr/sbin/policy-rc.d
+readonly guard_mark='# made by the setup of tolkwd, for the time of an installation'
+new_services=()
+
+# Keeps packages from starting services while they are installed.
+raise_guard() {
+    [ ! -e "$guard" ] || return 0
+    printf '#!/bin/sh\n%s\nexit 101\n' "$guard_mark" | as_root tee "$guard" >/dev/null
+    as_root chmod 755 "$guard"
+}
+
+# Also at the end of an interrupted installation, and by the next setup after one that was cut off.
+after_installing() {
+    local service
+    if grep -qsxF "$guard_mark" "$guard"; then
+        as_root rm -f "$guard"
     fi
+    for service in "${new_services[@]}"; do
+        [ ! -e "/etc/init.d/$service" ] || as_root update-rc.d "$service" disable
+    done
+    new_services=()
+}
+
+install_quietly() {
+    local service
+    for service in "${demo_services[@]}"; do
+        [ -e "/etc/init.d/$service" ] || new_services+=("$service")
+    done
+    trap after_installing EXIT
+    raise_guard
     as_root env DEBIAN_FRONTEND=noninteractive \
         apt-get install --yes --no-install-recommends "$@"
-    for service in redis-server nginx; do
-        case " $* " in
-            *" $service "* | *" $service-light "*) as_root update-rc.d "$service" disable ;;
-        esac
-    done
-    if [ "$guarded" = yes ]; then
-        as_root rm -f "$guard"
-        trap - EXIT
-    fi
+    after_installing
+    trap - EXIT
 }
 
 # Makes sure that everything of these groups of packages.txt is there.
 setup() {
     local missing
     command -v dpkg-query >/dev/null || fail "this sets up Debian machines only"
-    mapfile -t missing < <(missing_packages "$@")
-    [ ${#missing[@]} -gt 0 ] || return 0
+    after_installing
+    missing=$(missing_packages "$@")
+    [ -n "$missing" ] || return 0
+    mapfile -t missing <<<"$missing"
     printf 'installing: %s\n' "${missing[*]}"
     as_root apt-get update --quiet || printf 'apt-get update failed, going on without\n' >&2
     install_quietly "${missing[@]}"
