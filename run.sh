@@ -32,23 +32,19 @@ if [ $# -eq 0 ]; then
     exec "$root/scripts/demo/run.sh" "$root/build/release/src/tolkwd"
 fi
 
-# The daemon judges its arguments itself; this only keeps a slip from setting up a machine.
-case " $* " in
-    *" -i "*" -l "* | *" -l "*" -i "*) ;;
-    *)
-        usage >&2
-        exit 2
-        ;;
-esac
-
 # Standard output belongs to the daemon's log.
 setup build >&2
 build release -DBUILD_TESTING=OFF >&2
-# The daemon expects the folder of its pings' output; without it every ping would fail.
-if [ ! -d /opt/varden/tolk/bin ]; then
-    as_root mkdir -p /opt/varden/tolk/bin
-    printf 'made /opt/varden/tolk/bin for the output of the pings\n' >&2
-fi
+# The daemon expects the folder of its pings' output; without it every ping would fail. Where it
+# will refuse its arguments anyway, the machine is left as it is.
+case " $* " in
+    *" -i "*" -l "* | *" -l "*" -i "*)
+        if [ ! -d /opt/varden/tolk/bin ]; then
+            as_root mkdir -p /opt/varden/tolk/bin
+            printf 'made /opt/varden/tolk/bin for the output of the pings\n' >&2
+        fi
+        ;;
+esac
 as_root true # fails here, with its reason, where there is no way to become root
 if [ "$(id -u)" -eq 0 ]; then
     exec "$root/build/release/src/tolkwd" "$@"
