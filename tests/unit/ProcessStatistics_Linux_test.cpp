@@ -1,11 +1,9 @@
 #include "ProcessStatistics_Linux.h"
 
 #include <cerrno>
-#include <chrono>
 #include <csignal>
 #include <filesystem>
 #include <sstream>
-#include <thread>
 
 #include <fcntl.h>
 #include <sys/wait.h>
@@ -211,11 +209,8 @@ TEST_F(UtilityWithShell, PidofFindsAProgramByItsPathAndElseByItsName)
     EXPECT_EQ(Utility::pidof(folder.path(name)), "");
     {
         const Probe probe(folder.path(name));
-        const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(60);
-        while (Utility::pidof(folder.path(name)).empty() &&
-               std::chrono::steady_clock::now() < deadline) {
-            std::this_thread::yield(); // until it has become that program
-        }
+        // Until it has become that program.
+        EXPECT_TRUE(await([&] { return !Utility::pidof(folder.path(name)).empty(); }));
         EXPECT_EQ(Utility::pidof(folder.path(name)), probe.text());
         EXPECT_EQ(Utility::pidof(name), probe.text());
         EXPECT_EQ(Utility::pidof("/no/such/folder/" + name), probe.text());

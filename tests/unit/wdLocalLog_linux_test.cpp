@@ -3,9 +3,9 @@
 #include <algorithm>
 #include <array>
 #include <atomic>
-#include <chrono>
 #include <cstdlib>
 #include <filesystem>
+#include <fstream>
 #include <iterator>
 #include <regex>
 #include <set>
@@ -336,6 +336,19 @@ private:
     std::size_t filling = 0;
 };
 
+// How many threads of this process wait for something.
+int sleepingthreads()
+{
+    int count = 0;
+    for (const auto& task : std::filesystem::directory_iterator("/proc/self/task")) {
+        std::ifstream file(task.path() / "stat");
+        std::string status;
+        std::getline(file, status);
+        count += status.find(") S ") != std::string::npos ? 1 : 0;
+    }
+    return count;
+}
+
 TEST_F(LocalLogDeath, OnlyTheFirstThreadSpeaks)
 {
     FullPipe errors;
@@ -352,10 +365,8 @@ TEST_F(LocalLogDeath, OnlyTheFirstThreadSpeaks)
                     wdLocalLog::LogMessage("m", kLevelInfo, "x");
                 });
             }
-            while (ready < kThreads) {
-                std::this_thread::yield();
-            }
-            std::this_thread::sleep_for(std::chrono::milliseconds(20)); // only sharpens the test
+            // All of them have met the missing log, and wait: one to speak, the others for its end.
+            await([&] { return ready == kThreads && sleepingthreads() >= kThreads; });
             errors.drain();
             threads.front().join();
         },

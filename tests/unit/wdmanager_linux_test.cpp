@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <atomic>
 #include <cerrno>
-#include <chrono>
 #include <filesystem>
 #include <sstream>
 #include <thread>
@@ -200,9 +199,7 @@ TEST_F(Manager, ThreadThatEndedEarlyIsRevivedByTheRefresh)
     // Each generation lives until its one thread has pinged, and with that has ended.
     world.onsleep = [&, ticks = 0](unsigned) mutable {
         ++ticks;
-        while (pings < (ticks + 1) / globalrefresh) {
-            std::this_thread::yield();
-        }
+        EXPECT_TRUE(await([&] { return pings >= (ticks + 1) / globalrefresh; }));
     };
     const std::string happened = supervise(7);
     const std::string gone =
@@ -286,15 +283,13 @@ TEST_F(Manager, RealThreadsAreStoppedJoinedAndStartedAfresh)
     int ticks = 0;
     world.onsleep = [&](unsigned) {
         if (std::this_thread::get_id() != mainthread) {
-            std::this_thread::sleep_for(std::chrono::milliseconds(1));
+            std::this_thread::yield();
             return;
         }
         // Each generation lives until its threads have pinged.
         if (++ticks % globalrefresh == 2) {
             const int before = pings;
-            while (pings < before + 4) {
-                std::this_thread::yield();
-            }
+            EXPECT_TRUE(await([&] { return pings >= before + 4; }));
         }
         if (ticks == 3 * globalrefresh + 1) {
             throw StopHere();

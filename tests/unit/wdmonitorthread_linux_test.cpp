@@ -5,7 +5,6 @@
 
 #include <algorithm>
 #include <atomic>
-#include <chrono>
 #include <deque>
 #include <fstream>
 #include <initializer_list>
@@ -488,7 +487,7 @@ TEST_F(MonitorThread, NegativeAllowanceCyclesWithoutPingOrPauseUntilDisabled)
     web.maxattemptofwakeup = "-1";
     std::atomic<bool> disabled = false;
     std::thread manager([&] {
-        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+        EXPECT_TRUE(await([&] { return world.events().find(kEntry.back()) != std::string::npos; }));
         disabled = true;
         std::atomic_ref(globalenable).store(0);
     });
@@ -1250,11 +1249,10 @@ TEST_F(GeneralPing, WaitsWhileAnotherThreadHoldsTheLockForWriting)
         return answer(command);
     };
     std::optional<LockHeld> held(std::in_place);
+    world.recordthreads = true;
     std::thread pinging([this] { EXPECT_EQ(wdmonitorthread(watched).generalping(web), 0); });
-    while (world.events().find(kRefusedPing) == std::string::npos) {
-        std::this_thread::yield();
-    }
-    std::this_thread::sleep_for(std::chrono::milliseconds(5)); // only sharpens the test
+    EXPECT_TRUE(await(
+        [this] { return world.events().find("take lock for reading") != std::string::npos; }));
     EXPECT_FALSE(pinged);
     held.reset();
     pinging.join();

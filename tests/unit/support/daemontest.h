@@ -2,12 +2,28 @@
 // settings and process-wide state as at the program's start, and the World.
 #pragma once
 
+#include <chrono>
 #include <string>
+#include <thread>
 
 #include <gtest/gtest.h>
 
 #include "temporaryfolder.h"
 #include "world.h"
+
+// Whether `condition` comes true within a minute.
+template <typename Condition>
+bool await(Condition condition)
+{
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::minutes(1);
+    while (!condition()) {
+        if (std::chrono::steady_clock::now() > deadline) {
+            return false;
+        }
+        std::this_thread::yield();
+    }
+    return true;
+}
 
 class DaemonTest : public ::testing::Test {
 protected:
