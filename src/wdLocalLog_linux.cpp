@@ -1,12 +1,16 @@
 #include "wdLocalLog_linux.h"
 
+#include <algorithm>
 #include <array>
 #include <atomic>
 #include <cerrno>
+#include <climits>
+#include <csignal>
 #include <ctime>
-#include <string_view>
+#include <mutex>
 
 #include <fcntl.h>
+#include <poll.h>
 #include <pthread.h>
 #include <unistd.h>
 
@@ -20,21 +24,66 @@ constexpr off_t kLogLimitBytes = 1023999;
 constexpr std::size_t kAsctimeBytes = 26;
 constexpr mode_t kLogFileMode = 0666;
 constexpr int kLogUnavailableStatus = 200;
+constexpr int kReaderPatienceMilliseconds = 5000;
+
+// Takes what one write() has written off the front of `text`. False on any error but an
+// interruption.
+bool writesome(int fd, std::string_view& text, std::size_t most)
+{
+    const ssize_t written = write(fd, text.data(), std::min(most, text.size()));
+    if (written <= 0) {
+        return written < 0 && errno == EINTR;
+    }
+    text.remove_prefix(static_cast<std::size_t>(written));
+    return true;
+}
 
 // Writes the whole text with as few write() calls as the system allows: one, unless it is cut
-// short. Gives up silently on any error but an interruption.
+// short. Gives up silently on an error.
 void writetext(int fd, std::string_view text)
 {
-    while (!text.empty()) {
-        const ssize_t written = write(fd, text.data(), text.size());
-        if (written < 0 && errno == EINTR) {
-            continue;
-        }
-        if (written <= 0) {
-            return;
-        }
-        text.remove_prefix(static_cast<std::size_t>(written));
+    while (!text.empty() && writesome(fd, text, text.size())) {
     }
+}
+
+// Keeps a pipe without a reader from ending the process, for as long as the calling thread writes.
+// Not by ignoring SIGPIPE, which the services that the daemon starts would inherit.
+class brokenpipeguard {
+public:
+    brokenpipeguard()
+    {
+        sigemptyset(&brokenpipe);
+        sigaddset(&brokenpipe, SIGPIPE);
+        pthread_sigmask(SIG_BLOCK, &brokenpipe, &before);
+    }
+    ~brokenpipeguard() { pthread_sigmask(SIG_SETMASK, &before, nullptr); }
+    brokenpipeguard(const brokenpipeguard&) = delete;
+    brokenpipeguard& operator=(const brokenpipeguard&) = delete;
+
+    // Takes the signal of a write that failed with EPIPE off this thread.
+    void takesignal() const
+    {
+        const timespec now{};
+        while (sigtimedwait(&brokenpipe, nullptr, &now) < 0 && errno == EINTR) {
+        }
+    }
+
+private:
+    sigset_t brokenpipe{};
+    sigset_t before{};
+};
+
+// Whether standard output or standard error, `fd`, can take PIPE_BUF bytes without delay. `stuck`
+// is what the last answer for it was: only a stream that has been read so far is waited for.
+bool cantake(int fd, bool& stuck)
+{
+    pollfd stream{fd, POLLOUT, 0};
+    int ready = 0;
+    do {
+        ready = poll(&stream, 1, stuck ? 0 : kReaderPatienceMilliseconds);
+    } while (ready < 0 && errno == EINTR);
+    stuck = ready == 0;
+    return ready > 0;
 }
 
 // Several threads can find the log gone at once, while others still use the process-wide lists.
@@ -48,7 +97,7 @@ void writetext(int fd, std::string_view text)
             pause();
         }
     }
-    writetext(STDERR_FILENO, "Unable to open the log file\n");
+    writestandard(STDERR_FILENO, "Unable to open the log file\n");
     _exit(kLogUnavailableStatus);
 }
 
@@ -103,6 +152,25 @@ std::string timetext(std::time_t when)
 
 } // namespace
 
+// A look at the room that there is and the write behind it belong together, or the writes of other
+// threads could fill it in between and this one would wait for ever: hence the turns. Only
+// standard output and standard error have them; lines reach the file without.
+void writestandard(int fd, std::string_view text)
+{
+    static std::mutex turn;
+    static std::array<bool, STDERR_FILENO + 1> stuck{};
+    const std::scoped_lock lock(turn);
+    const brokenpipeguard guard;
+    while (!text.empty() && cantake(fd, stuck.at(static_cast<std::size_t>(fd)))) {
+        if (!writesome(fd, text, PIPE_BUF)) {
+            if (errno == EPIPE) {
+                guard.takesignal();
+            }
+            return;
+        }
+    }
+}
+
 wdLocalLog::wdLocalLog(const std::string& path)
 {
     logFilePath = path;
@@ -117,7 +185,7 @@ void wdLocalLog::LogMessage(std::string module, int level, std::string message)
         line.append(" ").append(levelword(level)).append(" ").append(module);
         line.append("|TID").append(std::to_string(pthread_self()));
         line.append(" ").append(message).append("\n");
-        writetext(STDOUT_FILENO, line);
+        writestandard(STDOUT_FILENO, line);
         writetext(fd, line);
     }
     close(fd);

@@ -6,6 +6,7 @@
 #pragma once
 
 #include <string>
+#include <string_view>
 
 // Levels of LogMessage. Any other number is written with an empty level word.
 enum loglevel : int {
@@ -24,10 +25,16 @@ public:
     // A message of level kLevelDebug is dropped unless debugenable is set, but the file is opened
     // (and emptied, if it is over its limit) all the same. A failing write is not reported: the
     // daemon carries on. A file that cannot be opened ends the process with status 200 after one
-    // line on standard error. Any thread; takes no lock.
+    // line on standard error. Any thread; threads take turns on standard output, none on the file.
     static void LogMessage(std::string module, int level, std::string message);
 
     // Where the messages go. Set by the constructor; read by every thread, so change it only while
     // no other thread logs.
     static std::string logFilePath;
 };
+
+// Writes `text` to `fd`, which is standard output or standard error, and never lets whoever should
+// read it stop or end the daemon: a reader that has stopped reading is waited for 5 seconds, then
+// what there is no room for is left out until there is room again; one that has gone is nothing
+// more than a failed write, which is not reported. Any thread; they take turns.
+void writestandard(int fd, std::string_view text);

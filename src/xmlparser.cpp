@@ -2,11 +2,13 @@
 
 #include <array>
 #include <cstdio>
-#include <iostream>
 #include <stdexcept>
 #include <string_view>
 
+#include <unistd.h>
+
 #include "ProcessStatistics_Linux.h"
+#include "wdLocalLog_linux.h"
 #include "wdxmlparserhandler.h"
 
 const char control[20] = {'\n', '\r', '\t', ' '};
@@ -25,7 +27,7 @@ std::string readfile(const std::string& path)
     const auto file = Utility::OpenToRead(path);
     if (!file) {
         // The 0 stands where a reason would; scripts that watch standard error match it.
-        std::cerr << "error, unable to open the input file: 0" << std::endl;
+        writestandard(STDERR_FILENO, "error, unable to open the input file: 0\n");
         return text;
     }
     std::array<char, kReadBlockBytes> block{};

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <array>
 #include <atomic>
+#include <csignal>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
@@ -25,6 +26,77 @@
 namespace {
 
 constexpr std::size_t kLimitBytes = 1023999;
+
+// A pipe that is full and that nobody reads, but for this object.
+class FullPipe {
+public:
+    FullPipe()
+    {
+        if (pipe2(ends.data(), O_NONBLOCK) != 0) {
+            throw std::runtime_error("no pipe");
+        }
+        for (ssize_t put = 0; (put = write(ends[1], kFiller.data(), kFiller.size())) > 0;) {
+            filling += static_cast<std::size_t>(put);
+        }
+        fcntl(ends[1], F_SETFL, 0);
+    }
+
+    ~FullPipe()
+    {
+        leave();
+        close(ends[1]);
+    }
+    FullPipe(const FullPipe&) = delete;
+    FullPipe& operator=(const FullPipe&) = delete;
+
+    // Becomes standard output or standard error.
+    void become(int fd) const { dup2(ends[1], fd); }
+
+    // From now on there is no reader at all.
+    void leave()
+    {
+        if (ends[0] >= 0) {
+            close(ends[0]);
+        }
+        ends[0] = -1;
+    }
+
+    // Takes out the filling, and nothing else.
+    void drain() const
+    {
+        std::string rest(filling, '\0');
+        for (ssize_t got = 0;
+             !rest.empty() && (got = read(ends[0], rest.data(), rest.size())) > 0;) {
+            rest.resize(rest.size() - static_cast<std::size_t>(got));
+        }
+    }
+
+    // What was written besides it.
+    [[nodiscard]] std::string text() const
+    {
+        std::array<char, 4096> block{};
+        const ssize_t got = read(ends[0], block.data(), block.size());
+        return got > 0 ? std::string(block.data(), static_cast<std::size_t>(got)) : "";
+    }
+
+private:
+    static constexpr std::string_view kFiller = "................................";
+    std::array<int, 2> ends{};
+    std::size_t filling = 0;
+};
+
+// How many threads of this process wait for something.
+int sleepingthreads()
+{
+    int count = 0;
+    for (const auto& task : std::filesystem::directory_iterator("/proc/self/task")) {
+        std::ifstream file(task.path() / "stat");
+        std::string status;
+        std::getline(file, status);
+        count += status.find(") S ") != std::string::npos ? 1 : 0;
+    }
+    return count;
+}
 
 class LocalLog : public DaemonTest {
 protected:
@@ -252,7 +324,135 @@ TEST_F(LocalLog, NoThreadsLineIsTornOrLost)
     EXPECT_EQ(shown, written);
 }
 
+// Two hundred monitors log past the limit, several times over. The file may lose what an emptying
+// takes, the lines before it, and nothing behind: what it holds of each thread is an unbroken run
+// up to that thread's last line.
+TEST_F(LocalLog, TwoHundredThreadsOverTheLimitLoseWhatAnEmptyingTakesAndNoMore)
+{
+    constexpr int kThreads = 200;
+    constexpr int kMessages = 200;
+    const std::string padding(60, '.');
+    folder.write("log", std::string(kLimitBytes - 100, 'x') + "\n");
+    std::atomic<bool> go = false;
+    std::vector<std::thread> threads(kThreads);
+    for (int t = 0; t < kThreads; ++t) {
+        threads.at(static_cast<std::size_t>(t)) = std::thread([&, t] {
+            go.wait(false);
+            for (int i = 0; i < kMessages; ++i) {
+                wdLocalLog::LogMessage("m", kLevelInfo,
+                                       std::to_string(t) + ":" + std::to_string(i) + " " + padding);
+            }
+        });
+    }
+    go = true;
+    go.notify_all();
+    for (auto& thread : threads) {
+        thread.join();
+    }
+    const std::regex whole(R"(Mon Nov 16 03:19:16 2026 INFO m\|TID\d+ (\d+):(\d+) \.{60})");
+    std::vector<int> expected(kThreads, -1); // of each thread, the next line's number; -1: any
+    std::istringstream text(log());
+    int count = 0;
+    for (std::string line; std::getline(text, line); ++count) {
+        std::smatch match;
+        ASSERT_TRUE(std::regex_match(line, match, whole)) << line;
+        int& next = expected.at(std::stoul(match[1]));
+        const int number = std::stoi(match[2]);
+        ASSERT_TRUE(next == -1 || next == number) << line << ", expected was number " << next;
+        next = number + 1;
+    }
+    for (const int next : expected) {
+        EXPECT_TRUE(next == -1 || next == kMessages) << "a thread's lines end with " << next - 1;
+    }
+    EXPECT_GT(count, 0);
+    EXPECT_LT(count, kThreads * kMessages); // it was emptied
+}
+
+using StandardOutput = LocalLog;
+
+TEST_F(StandardOutput, UnreadPipeIsWaitedForOnceAndThenLeftOut)
+{
+    FullPipe output;
+    output.become(STDOUT_FILENO);
+    world.recordpolls = true;
+    world.readerneverreads = true;
+    wdLocalLog::LogMessage("m", kLevelInfo, "one");
+    wdLocalLog::LogMessage("m", kLevelInfo, "two");
+    EXPECT_EQ(world.events(), lines({"wait 5000 ms for 1", "INFO one", "wait 0 ms for 1", //
+                                     "INFO two"}));
+    output.drain();
+    EXPECT_EQ(output.text(), "");
+}
+
+TEST_F(StandardOutput, GoesOnWhenThePipeIsReadAgain)
+{
+    FullPipe output;
+    output.become(STDOUT_FILENO);
+    world.readerneverreads = true;
+    wdLocalLog::LogMessage("m", kLevelInfo, "one");
+    output.drain();
+    wdLocalLog::LogMessage("m", kLevelInfo, "two");
+    EXPECT_EQ(output.text(), "Mon Nov 16 03:19:16 2026 INFO m|TID" + tid() + " two\n");
+    world.recordpolls = true;
+    wdLocalLog::LogMessage("m", kLevelInfo, "three"); // patience has come back
+    EXPECT_NE(world.events().find("wait 5000 ms for 1\n"), std::string::npos);
+}
+
+TEST_F(StandardOutput, SlowReaderGetsEverything)
+{
+    FullPipe output;
+    output.become(STDOUT_FILENO);
+    std::thread logging([] { wdLocalLog::LogMessage("m", kLevelInfo, "patient"); });
+    await([] { return sleepingthreads() >= 1; });
+    output.drain();
+    logging.join();
+    EXPECT_NE(output.text().find("patient\n"), std::string::npos);
+}
+
+// What is in a pipe's way comes in pieces that it has room for, or a long line would wait in
+// write() itself.
+TEST_F(StandardOutput, LongLineDoesNotBlockInAPipeWithLittleRoom)
+{
+    FullPipe output;
+    output.become(STDOUT_FILENO);
+    output.drain();
+    world.readerneverreads = true;
+    const std::string message(200'000, '.'); // more than any pipe takes by default
+    wdLocalLog::LogMessage("m", kLevelInfo, message);
+    EXPECT_NE(log().find(" " + message + "\n"), std::string::npos);
+}
+
+TEST_F(StandardOutput, PipeWithoutReaderIsNoMoreThanAFailedWrite)
+{
+    FullPipe output;
+    output.become(STDOUT_FILENO);
+    output.leave();
+    wdLocalLog::LogMessage("m", kLevelInfo, "heard by nobody");
+    EXPECT_NE(log().find("heard by nobody\n"), std::string::npos);
+    sigset_t signals;
+    sigpending(&signals);
+    EXPECT_EQ(sigismember(&signals, SIGPIPE), 0);
+    pthread_sigmask(SIG_SETMASK, nullptr, &signals);
+    EXPECT_EQ(sigismember(&signals, SIGPIPE), 0);
+    struct sigaction action {};
+    sigaction(SIGPIPE, nullptr, &action);
+    EXPECT_EQ(action.sa_handler, SIG_DFL);
+}
+
 using LocalLogDeath = LocalLog;
+
+TEST_F(LocalLogDeath, FullStandardErrorDoesNotKeepTheProcessFromEnding)
+{
+    FullPipe errors;
+    EXPECT_EXIT(
+        {
+            errors.become(STDERR_FILENO);
+            world.readerneverreads = true;
+            wdLocalLog::logFilePath = folder.path("missing/log");
+            wdLocalLog::LogMessage("m", kLevelInfo, "x");
+        },
+        ::testing::ExitedWithCode(200), "");
+}
 
 TEST_F(LocalLogDeath, UnwritablePathEndsTheProcessWith200)
 {
@@ -288,73 +488,12 @@ TEST_F(LocalLogDeath, NoExitHandlerRuns)
         ::testing::ExitedWithCode(200), "^Unable to open the log file\n$");
 }
 
-// A pipe as standard error that is full until all threads have found the log gone.
-class FullPipe {
-public:
-    FullPipe()
-    {
-        if (pipe2(ends.data(), O_NONBLOCK) != 0) {
-            throw std::runtime_error("no pipe");
-        }
-        for (ssize_t put = 0; (put = write(ends[1], kFiller.data(), kFiller.size())) > 0;) {
-            filling += static_cast<std::size_t>(put);
-        }
-        fcntl(ends[1], F_SETFL, 0);
-    }
-
-    ~FullPipe()
-    {
-        close(ends[0]);
-        close(ends[1]);
-    }
-    FullPipe(const FullPipe&) = delete;
-    FullPipe& operator=(const FullPipe&) = delete;
-
-    void becomestandarderror() const { dup2(ends[1], STDERR_FILENO); }
-
-    // Takes out the filling, and nothing else.
-    void drain() const
-    {
-        std::string rest(filling, '\0');
-        for (ssize_t got = 0;
-             !rest.empty() && (got = read(ends[0], rest.data(), rest.size())) > 0;) {
-            rest.resize(rest.size() - static_cast<std::size_t>(got));
-        }
-    }
-
-    // What was written besides it.
-    [[nodiscard]] std::string text() const
-    {
-        std::array<char, 4096> block{};
-        const ssize_t got = read(ends[0], block.data(), block.size());
-        return got > 0 ? std::string(block.data(), static_cast<std::size_t>(got)) : "";
-    }
-
-private:
-    static constexpr std::string_view kFiller = "................................";
-    std::array<int, 2> ends{};
-    std::size_t filling = 0;
-};
-
-// How many threads of this process wait for something.
-int sleepingthreads()
-{
-    int count = 0;
-    for (const auto& task : std::filesystem::directory_iterator("/proc/self/task")) {
-        std::ifstream file(task.path() / "stat");
-        std::string status;
-        std::getline(file, status);
-        count += status.find(") S ") != std::string::npos ? 1 : 0;
-    }
-    return count;
-}
-
 TEST_F(LocalLogDeath, OnlyTheFirstThreadSpeaks)
 {
     FullPipe errors;
     EXPECT_EXIT(
         {
-            errors.becomestandarderror();
+            errors.become(STDERR_FILENO);
             wdLocalLog::logFilePath = folder.path("missing/log");
             constexpr int kThreads = 20;
             std::atomic<int> ready = 0;

@@ -11,6 +11,7 @@
 #include <sstream>
 
 #include <fcntl.h>
+#include <poll.h>
 
 #include "wdLocalLog_linux.h"
 
@@ -98,6 +99,9 @@ void World::reset(const std::string& folder, const std::string& module)
     now = 1'000'000'000;
     existing.clear();
     files.clear();
+    onrealproc = nullptr;
+    recordpolls = false;
+    readerneverreads = false;
     recordopens = false;
     lockinitresult = 0;
     writelockfails = false;
@@ -160,6 +164,7 @@ int __real_pclose(std::FILE* stream);
 std::FILE* __real_popen(const char* command, const char* mode);
 int __real_system(const char* command);
 int __real_open(const char* path, int flags, ...);
+int __real_poll(pollfd* streams, nfds_t count, int timeout);
 int __real_pthread_create(pthread_t* id, const pthread_attr_t* attributes, void* (*body)(void*),
                           void* argument);
 [[noreturn]] void __real_pthread_exit(void* value);
@@ -182,9 +187,14 @@ std::FILE* __wrap_fopen(const char* path, const char* mode)
     if (std::strncmp(path, "/proc/", 6) != 0) {
         return __real_fopen(path, mode);
     }
-    const auto& files = World::current().files;
-    const auto found = files.find(path);
-    if (found == files.end()) {
+    const auto& world = World::current();
+    if (world.onrealproc) {
+        std::FILE* real = __real_fopen(path, mode);
+        world.onrealproc();
+        return real;
+    }
+    const auto found = world.files.find(path);
+    if (found == world.files.end()) {
         errno = ENOENT;
         return nullptr;
     }
@@ -210,6 +220,16 @@ int __wrap_open(const char* path, int flags, ...)
                      flag(O_CLOEXEC, "cloexec") + " mode " + std::to_string(mode));
     }
     return __real_open(path, flags, mode);
+}
+
+int __wrap_poll(pollfd* streams, nfds_t count, int timeout)
+{
+    auto& world = World::current();
+    if (world.recordpolls) {
+        world.record("wait " + std::to_string(timeout) + " ms for " + std::to_string(streams->fd));
+    }
+    const bool waits = timeout != 0 && !world.readerneverreads;
+    return __real_poll(streams, count, waits ? -1 : 0);
 }
 
 std::FILE* __wrap_popen(const char* command, const char* mode)

@@ -56,8 +56,11 @@ public:
     std::atomic<std::time_t> now = 0;         // what time() gives
     std::set<std::string> existing;           // for access(); any other path does not exist
     std::map<std::string, std::string> files; // for fopen() of paths below /proc/
+    std::function<void()> onrealproc;         // fopen() opens the real ones, then calls this
 
-    bool recordopens = false; // write open() down, with what matters of its flags
+    bool recordpolls = false;      // write poll() down
+    bool readerneverreads = false; // poll() does not wait; else it waits for as long as it takes
+    bool recordopens = false;      // write open() down, with what matters of its flags
     std::function<void(const std::string&)> onthread; // called for each thread call
     int lockinitresult = 0;
     bool writelockfails = false; // asking for the write side takes the read side and gives EINVAL
