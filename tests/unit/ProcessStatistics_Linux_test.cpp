@@ -497,6 +497,24 @@ TEST_F(Statistics, GoneProcessIsReportedEachTimeAndTheLastFiguresDecide)
     EXPECT_EQ(check(), unable + figures(0, 51, 1, true));
 }
 
+TEST_F(Statistics, ProcessThatEndsBetweenOpeningAndReadingIsAFailedFetch)
+{
+    const pid_t child = fork();
+    if (child == 0) {
+        for (;;) {
+            pause();
+        }
+    }
+    processis(child);
+    world.onrealproc = [child] {
+        kill(child, SIGKILL);
+        waitpid(child, nullptr, 0);
+    };
+    EXPECT_EQ(check(), "DEBUG (web) PID changed (old = -1, new = " + std::to_string(child) +
+                           ")\nERROR (web) Unable to fetch stats of process from system\n" +
+                           figures(0, 0, 0, false));
+}
+
 TEST_F(Statistics, ProgramNeverSeenDecidesOnZeroes)
 {
     processis(0);

@@ -12,9 +12,11 @@
 #include <optional>
 #include <thread>
 
+#include <fcntl.h>
 #include <unistd.h>
 
 #include "daemontest.h"
+#include "wdlogbuffer.h"
 #include "wdsettings.h"
 #include "xmlparser.h"
 
@@ -1399,6 +1401,44 @@ TEST_F(GeneralRecovery, TwoDependentsStopAndStartInTheSameOrder)
                   "DEBUG User provided command start dep:start-a", kRefusedPing, "run start-a",
                   "DEBUG User provided command start dep:start-b", kRefusedPing, "run start-b"},
                  kRecoveryEnds}));
+}
+
+// Each start happens while fifty threads have the log or another file open.
+TEST_F(GeneralRecovery, StartCommandInheritsTheThreeStandardDescriptorsOnly)
+{
+    constexpr int kStarts = 1000;
+    constexpr int kThreads = 50;
+    // The ":" keeps the shell from becoming ls, whose own descriptors do not matter.
+    web.startcmd = "exec >>" + folder.path("descriptors") + "; ls /proc/$$/fd; :";
+    world.onsystem = runforreal;
+    debugenable = false; // a dropped line opens the log, too
+    for (int fd = STDERR_FILENO + 1; fd < kStarts; ++fd) {
+        fcntl(fd, F_SETFD, FD_CLOEXEC); // what the test's own framework has open
+    }
+    std::atomic<int> starts = 0;
+    std::vector<std::thread> threads(kThreads);
+    for (auto& thread : threads) {
+        thread = std::thread([this, &starts] {
+            for (int seen = 0; seen < kStarts; seen = starts) {
+                starts.wait(seen);
+                wdlog("m", kLevelDebug, "busy");
+                const auto file = Utility::OpenToRead(folder.path("log"));
+            }
+        });
+    }
+    for (int i = 0; i < kStarts; ++i) {
+        ++starts;
+        starts.notify_all();
+        wdmonitorthread(watched).generalrecover(1);
+    }
+    for (auto& thread : threads) {
+        thread.join();
+    }
+    std::string expected;
+    for (int i = 0; i < kStarts; ++i) {
+        expected += "0\n1\n2\n";
+    }
+    EXPECT_EQ(folder.read("descriptors"), expected);
 }
 
 TEST_F(GeneralRecovery, UnconfiguredDependentIsLeftAloneAndTheRestProceeds)
