@@ -54,7 +54,8 @@ std::string trimmed(std::string_view token)
 class scan {
 public:
     explicit scan(std::string_view whole)
-        : text(whole), pos(whole.find('<')), cur(pos), last(whole.rfind('>'))
+        : text(whole), pos(whole.find('<')), cur(pos), last(whole.rfind('>')),
+          behinddeclaration(placebehinddeclaration(whole))
     {
     }
 
@@ -77,22 +78,23 @@ public:
     }
 
 private:
-    // The search for the "?" that ends a declaration begins at a fixed place: it is meant for one
-    // at the first byte. Elsewhere it would lead back over text already read, without end; there
-    // the "<?" is read as any other tag.
-    void skipdeclaration()
+    // Where the text goes on behind a declaration at its first byte; without the "?" that ends one,
+    // at the declaration's first "?".
+    static std::size_t placebehinddeclaration(std::string_view whole)
     {
         constexpr std::size_t kInsideDeclaration = 2;
         constexpr std::size_t kDeclarationEndBytes = 2;
-        if (text.substr(cur, 2) != "<?") {
-            return;
-        }
-        // Without any further "?", the text goes on at the declaration's first one.
         constexpr std::size_t kWithoutMark = 1;
-        const std::size_t mark = text.find('?', kInsideDeclaration);
-        const std::size_t behind = mark == npos ? kWithoutMark : mark + kDeclarationEndBytes;
-        if (behind >= cur) {
-            pos = behind;
+        const std::size_t mark = whole.find('?', kInsideDeclaration);
+        return mark == npos ? kWithoutMark : mark + kDeclarationEndBytes;
+    }
+
+    // There is one place behind a declaration, wherever the "<?" stands. From a later one it would
+    // lead back over text already read, without end; there the "<?" is read as any other tag.
+    void skipdeclaration()
+    {
+        if (text.substr(cur, 2) == "<?" && behinddeclaration >= cur) {
+            pos = behinddeclaration;
         }
     }
 
@@ -142,6 +144,7 @@ private:
     std::size_t pos;
     std::size_t cur;
     std::size_t last;
+    std::size_t behinddeclaration;
 };
 
 } // namespace

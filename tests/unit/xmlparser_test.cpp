@@ -306,6 +306,18 @@ TEST_F(Reader, GarbageEndsTheReading)
     }
 }
 
+// A search through the long name for each of the tags would take minutes.
+TEST_F(Reader, ManyLateDeclarationsAreReadInOneGo)
+{
+    constexpr std::size_t kNameBytes = 16'000'000;
+    constexpr std::size_t kTags = 1'000'000;
+    std::string text = "<" + std::string(kNameBytes, 'n') + "><b>";
+    for (std::size_t tag = 0; tag < kTags; ++tag) {
+        text += "<?>";
+    }
+    EXPECT_EQ(read(text).size(), kTags + 2);
+}
+
 TEST_F(Reader, FileLongerThanOneReadIsWhole)
 {
     const std::string longname(200000, 'n');
