@@ -22,6 +22,8 @@ namespace {
 using Texts = std::vector<std::string>;
 
 constexpr char kSeparator = '\x1e';
+constexpr std::size_t kPieces = 3;     // of a check
+constexpr std::size_t kMostChecks = 8; // one more would tell nothing new
 constexpr char kEndOfStat = '\xff';
 constexpr std::size_t kLeastFields = 24;
 constexpr std::size_t kLongestPiece = 127;
@@ -45,9 +47,9 @@ const MemoryFile logfile;
 std::vector<Check> checksof(const std::string& unit)
 {
     Texts pieces = cut(unit, kSeparator);
+    const std::size_t begun = (pieces.size() + kPieces - 1) / kPieces;
+    pieces.resize(std::min(begun, kMostChecks) * kPieces);
     std::vector<Check> checks;
-    constexpr std::size_t kPieces = 3;
-    pieces.resize((pieces.size() + kPieces - 1) / kPieces * kPieces);
     for (std::size_t i = 0; i < pieces.size(); i += kPieces) {
         checks.push_back({leadingnumber<std::time_t>(pieces[i]), pieces[i + 1], pieces[i + 2]});
     }
