@@ -76,6 +76,15 @@ TEST_F(UtilityTest, ExecKeepsOfEachLineWhatStandsBeforeANulByte)
     EXPECT_EQ(output, "ac\n");
 }
 
+TEST_F(UtilityTest, ExecTakesLongLinesInPiecesOf127Characters)
+{
+    using namespace std::string_literals;
+    commandprints({"ab\0"s + std::string(124, 'x') + "cd\n"});
+    std::string output;
+    Utility::exec("binary", output);
+    EXPECT_EQ(output, "abcd\n");
+}
+
 TEST_F(UtilityTest, FilesAreOpenedCloseOnExec)
 {
     folder.write("file", "text");

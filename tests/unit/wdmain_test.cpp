@@ -70,6 +70,13 @@ protected:
 
 using CommandLineOptions = Startup;
 
+const bool kDebugAtStart = debugenable;
+
+TEST_F(CommandLineOptions, DebuggingIsOffUnlessItIsAskedFor)
+{
+    EXPECT_FALSE(kDebugAtStart);
+}
+
 TEST_F(CommandLineOptions, PathsAreTakenAndTheRestHasItsDefaults)
 {
     parseandcheck({"-i", "a.xml", "-l", "b.log"});
@@ -154,8 +161,9 @@ TEST_F(CommandLineOptions, NoArgumentsSetNothing)
 TEST_F(CommandLineOptions, ProgramsNameIsNoOption)
 {
     std::string name = "-g";
-    std::array<char*, 2> words{name.data(), nullptr};
-    parseArg(1, words.data());
+    std::string word = "hello";
+    std::array<char*, 3> words{name.data(), word.data(), nullptr};
+    parseArg(2, words.data());
     EXPECT_FALSE(debugenable);
 }
 
