@@ -1,0 +1,248 @@
+#!/usr/bin/python3
+"""Breaks the daemon on purpose, one behaviour at a time, and shows that its tests notice.
+
+mutants.toml lists the mutants; each replaces one piece of one source file and names the promise
+that the daemon then no longer keeps. All work is done in a copy of the tracked files, as they are
+in the working tree, in a temporary folder. The copy is built once and has to pass its tests. Then,
+for each mutant: change the file, build, run the unit tests of its module, then all unit tests, then
+the system tests, until one fails, and put the file back.
+
+The exit status is 0 when every mutant was caught, 1 when one survived, and 2 when the list, or the
+unbroken daemon itself, is at fault: a mutant that does not build, say, is not caught.
+"""
+
+import argparse
+import datetime
+import os
+import pathlib
+import re
+import resource
+import shutil
+import signal
+import subprocess
+import sys
+import tempfile
+import threading
+import time
+import tomllib
+
+ROOT = pathlib.Path(__file__).resolve().parents[2]
+LIST = pathlib.Path(__file__).with_name("mutants.toml")
+
+JOBS = "2"
+BUILD = ["cmake", "--build", "--preset", "debug", "--parallel", JOBS]
+# Without debug information: nobody debugs a mutant, and linking is most of the work.
+CONFIGURE = ["cmake", "--preset", "debug", "-DBUILD_TESTING=ON", "-DCMAKE_CXX_FLAGS_DEBUG=-O0"]
+
+# Each kind of tests, and how long all of them may take together. A mutant that hangs is caught by
+# this bound; one that never stops growing is caught by the other.
+TEST_SECONDS = {"unit": 60, "system": 300}
+TEST_MEMORY_BYTES = 4 << 30
+
+FAILED_TEST = re.compile(r"Test +#\d+: (\S+) .*\*\*\*")
+TIME_OUT = "time-out"
+
+KEYS = {"name", "breaks", "file", "before", "after"}
+
+
+class Fault(Exception):
+    """The list of mutants does not fit the sources, or the unbroken daemon is broken."""
+
+
+def load_mutants():
+    """Returns the mutants of the list, each checked against the sources."""
+    mutants = tomllib.loads(LIST.read_text())["mutant"]
+    names = set()
+    for mutant in mutants:
+        name = mutant.get("name", "(no name)")
+        if set(mutant) != KEYS:
+            raise Fault(f"{name}: needs exactly {', '.join(sorted(KEYS))}")
+        if name in names:
+            raise Fault(f"{name}: there are two")
+        names.add(name)
+        check_place(mutant)
+    return mutants
+
+
+def check_place(mutant):
+    """Makes sure that the text to replace is there exactly once, and is really replaced."""
+    source = (ROOT / mutant["file"]).read_text()
+    count = source.count(mutant["before"])
+    if count != 1:
+        raise Fault(f"{mutant['name']}: `before` is in {mutant['file']} {count} times")
+    if mutant["before"] == mutant["after"]:
+        raise Fault(f"{mutant['name']}: changes nothing")
+
+
+def select(mutants, names):
+    """Returns the mutants of these names, or all where there are none."""
+    unknown = set(names) - {mutant["name"] for mutant in mutants}
+    if unknown:
+        raise Fault(f"no such mutant: {', '.join(sorted(unknown))}")
+    return [mutant for mutant in mutants if not names or mutant["name"] in names]
+
+
+def git(*arguments):
+    """Returns what a git command prints about the project."""
+    return subprocess.run(["git", "-C", ROOT, *arguments], check=True, capture_output=True,
+                          text=True).stdout
+
+
+def copy_project(folder):
+    """Copies the tracked files, with what they hold now."""
+    for name in git("ls-files", "-z").split("\0"):
+        source = ROOT / name
+        if name and source.exists():
+            (folder / name).parent.mkdir(parents=True, exist_ok=True)
+            shutil.copy2(source, folder / name)
+
+
+def limit_memory():
+    """Bounds the memory of the process to come and of its children."""
+    resource.setrlimit(resource.RLIMIT_AS, (TEST_MEMORY_BYTES, TEST_MEMORY_BYTES))
+
+
+def build(folder, targets=("all",)):
+    """Builds these targets of the copy; raises where they do not build."""
+    result = subprocess.run([*BUILD, "--target", *targets], cwd=folder, check=False,
+                            stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True)
+    if result.returncode != 0:
+        raise Fault(f"does not build:\n{result.stdout}")
+
+
+def run_tests(folder, kind, pattern="."):
+    """Runs the tests of one kind until one fails; returns that one, a time-out, or None."""
+    command = ["ctest", "--test-dir", folder / "build/debug", "-L", kind, "-R", pattern,
+               "--parallel", JOBS, "--stop-on-failure", "--no-tests=error"]
+    scratch = folder / "scratch"  # for what a test that is killed leaves behind
+    scratch.mkdir(exist_ok=True)
+    output = []
+    with subprocess.Popen(command, stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True,
+                          env=os.environ | {"TMPDIR": str(scratch)}, start_new_session=True,
+                          preexec_fn=limit_memory) as ctest:
+        # All that it started is in the session that it leads.
+        bound = threading.Timer(TEST_SECONDS[kind], os.killpg, [ctest.pid, signal.SIGKILL])
+        bound.start()
+        try:
+            for line in ctest.stdout:
+                output.append(line)
+                if failed := FAILED_TEST.search(line):
+                    return failed.group(1)  # other tests may run on, or hang
+            ctest.wait()
+        finally:
+            bound.cancel()
+            if ctest.poll() is None:
+                os.killpg(ctest.pid, signal.SIGKILL)
+    if ctest.returncode == -signal.SIGKILL:
+        return TIME_OUT
+    if ctest.returncode != 0:
+        raise Fault(f"no test failed, but ctest did:\n{''.join(output)}")
+    return None
+
+
+def catch(folder, module):
+    """Builds and tests the copy, the quick tests first; returns what run_tests does."""
+    caught = None
+    if (folder / f"tests/unit/{module}_test.cpp").exists():
+        build(folder, [f"{module}_test"])
+        caught = run_tests(folder, "unit", rf"^{module}\.")
+    if not caught:
+        build(folder)
+        caught = run_tests(folder, "unit") or run_tests(folder, "system")
+    return caught
+
+
+def prepare(folder):
+    """Copies and builds the unbroken daemon, which has to pass its tests."""
+    copy_project(folder)
+    subprocess.run(CONFIGURE, cwd=folder, check=True, stdout=subprocess.DEVNULL)
+    build(folder)
+    failed = run_tests(folder, "unit") or run_tests(folder, "system")
+    if failed:
+        raise Fault(f"the unbroken daemon fails: {failed}")
+
+
+def try_mutant(folder, mutant):
+    """Returns who caught the mutant, or None."""
+    path = folder / mutant["file"]
+    unbroken = path.read_text()
+    path.write_text(unbroken.replace(mutant["before"], mutant["after"]))
+    try:
+        return catch(folder, path.stem)
+    finally:
+        path.write_text(unbroken)  # with a new time, so that it is built again
+
+
+def try_mutants(mutants):
+    """Returns (mutant, who caught it or None) for each that builds, and how many do not."""
+    results = []
+    faults = 0
+    with tempfile.TemporaryDirectory(prefix="tolkwd-mutation-",
+                                     ignore_cleanup_errors=True) as name:
+        folder = pathlib.Path(name)
+        prepare(folder)
+        for mutant in mutants:
+            try:
+                caught = try_mutant(folder, mutant)
+                results.append((mutant, caught))
+                print(f"{mutant['name']}: {caught or 'SURVIVED'}", flush=True)
+            except Fault as fault:
+                faults += 1
+                print(f"{mutant['name']}: {fault}", flush=True)
+    return results, faults
+
+
+def write_table(path, results):
+    """Writes who caught what as a Markdown table."""
+    state = git("rev-parse", "--short", "HEAD").strip()
+    if git("status", "--porcelain"):
+        state += " with local changes"
+    lines = [f"{datetime.date.today().isoformat()}, {state}", "",
+             "| name | breaks | caught by |", "|---|---|---|"]
+    for mutant, caught in results:
+        lines.append(f"| {mutant['name']} | {mutant['breaks']} | {caught or '**survived**'} |")
+    pathlib.Path(path).write_text("\n".join(lines) + "\n")
+
+
+def parse_arguments():
+    """Returns the command line's options."""
+    parser = argparse.ArgumentParser(description=__doc__,
+                                     formatter_class=argparse.RawDescriptionHelpFormatter)
+    parser.add_argument("--only", nargs="+", default=[], metavar="NAME",
+                        help="try these mutants only")
+    parser.add_argument("--table", metavar="FILE",
+                        help="write a Markdown table of the results to FILE")
+    parser.add_argument("--list", action="store_true",
+                        help="show the mutants and what they break, and try none")
+    return parser.parse_args()
+
+
+def main():
+    """Tries the mutants and returns the exit status."""
+    options = parse_arguments()
+    signal.signal(signal.SIGTERM, lambda *_: sys.exit(2))  # and tidy up
+    start = time.monotonic()
+    try:
+        mutants = select(load_mutants(), options.only)
+        if options.list:
+            for mutant in mutants:
+                print(f"{mutant['name']}: {mutant['breaks']}")
+            return 0
+        results, faults = try_mutants(mutants)
+    except Fault as fault:
+        print(fault, file=sys.stderr)
+        return 2
+    survivors = [mutant["name"] for mutant, caught in results if not caught]
+    print(f"{len(results) - len(survivors)} of {len(mutants)} caught in "
+          f"{time.monotonic() - start:.0f} s")
+    if survivors:
+        print("survived:", *survivors)
+    if options.table:
+        write_table(options.table, results)
+    if faults:
+        return 2
+    return 1 if survivors else 0
+
+
+if __name__ == "__main__":
+    sys.exit(main())
