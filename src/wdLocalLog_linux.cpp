@@ -150,6 +150,17 @@ std::string timetext(std::time_t when)
     return std::string(line.substr(0, line.find_first_of(std::string_view("\n\0", 2))));
 }
 
+// Nobody will read this stream again. A service that is started with it would be killed by the
+// first word that its start command prints.
+void replacebynull(int fd)
+{
+    const int null = open("/dev/null", O_WRONLY | O_CLOEXEC);
+    if (null >= 0) {
+        dup2(null, fd); // not close-on-exec: services inherit it
+        close(null);
+    }
+}
+
 } // namespace
 
 // A look at the room that there is and the write behind it belong together, or the writes of other
@@ -165,6 +176,7 @@ void writestandard(int fd, std::string_view text)
         if (!writesome(fd, text, PIPE_BUF)) {
             if (errno == EPIPE) {
                 guard.takesignal();
+                replacebynull(fd);
             }
             return;
         }

@@ -34,7 +34,7 @@ public:
 };
 
 // Writes `text` to `fd`, which is standard output or standard error, and never lets whoever should
-// read it stop or end the daemon: a reader that has stopped reading is waited for 5 seconds, then
-// what there is no room for is left out until there is room again; one that has gone is nothing
-// more than a failed write, which is not reported. Any thread; they take turns.
+// read it stop or end the daemon. A reader that has stopped reading is waited for 5 seconds; then
+// what there is no room for is left out until there is room again. A reader that has gone is
+// replaced by /dev/null. Other failures are not reported. Any thread; they take turns.
 void writestandard(int fd, std::string_view text);

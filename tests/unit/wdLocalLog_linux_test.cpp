@@ -422,7 +422,7 @@ TEST_F(StandardOutput, LongLineDoesNotBlockInAPipeWithLittleRoom)
     EXPECT_NE(log().find(" " + message + "\n"), std::string::npos);
 }
 
-TEST_F(StandardOutput, PipeWithoutReaderIsNoMoreThanAFailedWrite)
+TEST_F(StandardOutput, PipeWithoutReaderDoesNotEndTheProcess)
 {
     FullPipe output;
     output.become(STDOUT_FILENO);
@@ -437,6 +437,19 @@ TEST_F(StandardOutput, PipeWithoutReaderIsNoMoreThanAFailedWrite)
     struct sigaction action {};
     sigaction(SIGPIPE, nullptr, &action);
     EXPECT_EQ(action.sa_handler, SIG_DFL);
+}
+
+// Services inherit it: init scripts that print would be killed before they have started anything.
+TEST_F(StandardOutput, PipeWithoutReaderIsReplacedByNull)
+{
+    FullPipe output;
+    output.become(STDOUT_FILENO);
+    output.leave();
+    wdLocalLog::LogMessage("m", kLevelInfo, "heard by nobody");
+    EXPECT_EQ(std::filesystem::read_symlink("/proc/self/fd/1"), "/dev/null");
+    EXPECT_EQ(fcntl(STDOUT_FILENO, F_GETFD), 0);
+    const int status = runforreal("echo starting && exit 7");
+    EXPECT_EQ(status, exited(7));
 }
 
 using LocalLogDeath = LocalLog;
