@@ -2,7 +2,8 @@
 //
 // The file is opened, appended to and closed for every message, so an operator can move or remove
 // it at any time, and it is emptied once it has grown past 1023999 bytes. A log file that cannot
-// be opened ends the process: a watchdog that nobody can hear is no watchdog.
+// be opened ends the process: a watchdog that nobody can hear is no watchdog. All that the daemon
+// itself writes to standard output and standard error goes through here, too.
 #pragma once
 
 #include <string>
@@ -35,6 +36,7 @@ public:
 
 // Writes `text` to `fd`, which is standard output or standard error, and never lets whoever should
 // read it stop or end the daemon. A reader that has stopped reading is waited for 5 seconds; then
-// what there is no room for is left out until there is room again. A reader that has gone is
-// replaced by /dev/null. Other failures are not reported. Any thread; they take turns.
+// what there is no room for, be it the rest of a line, is left out until there is room again. A
+// reader that has gone is replaced by /dev/null. Other failures are not reported. Any thread; they
+// take turns.
 void writestandard(int fd, std::string_view text);

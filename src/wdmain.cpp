@@ -4,13 +4,13 @@
 #include <array>
 #include <csignal>
 #include <cstdlib>
-#include <iostream>
 #include <memory>
 
 #include <dirent.h>
 #include <fcntl.h>
 #include <unistd.h>
 
+#include "wdLocalLog_linux.h"
 #include "wdmanager_linux.h"
 
 namespace {
@@ -48,7 +48,7 @@ constexpr const char* kDebugOption = "-g";
 
 [[noreturn]] void refusecommandline(const char* message)
 {
-    std::cerr << message << std::endl;
+    writestandard(STDERR_FILENO, std::string(message) + "\n");
     exit(kBadCommandLineStatus);
 }
 

@@ -1,9 +1,7 @@
 // The command line, against a plain account of its options. A unit is the words, with a NUL byte
-// between each two, as in /proc/PID/cmdline. exit() is replaced at link time.
+// between each two, as in /proc/PID/cmdline. exit() and writestandard() are replaced at link time.
 
 #include <algorithm>
-#include <iostream>
-#include <sstream>
 
 #include "fuzz.h"
 #include "leadingnumber.h"
@@ -31,6 +29,9 @@ struct Exit {
 
 // Whether exit() is called by the daemon. The fuzzer itself ends through it, too.
 bool trying = false;
+
+// What the daemon has written to standard error.
+std::string said;
 
 struct Option {
     std::string word;
@@ -119,14 +120,12 @@ int start(Words words, Stopwatch& watch)
 Outcome actual(const Words& words, Stopwatch& watch)
 {
     resetsettings();
-    std::ostringstream said;
-    std::streambuf* const standard = std::cerr.rdbuf(said.rdbuf());
+    said.clear();
     const int status = start(words, watch);
-    std::cerr.rdbuf(standard);
     if (status != 0) {
-        return {"", "", 0, false, said.str(), status};
+        return {"", "", 0, false, said, status};
     }
-    return {configPath, wdlocallogpath, globalrefresh, debugenable, said.str(), 0};
+    return {configPath, wdlocallogpath, globalrefresh, debugenable, said, 0};
 }
 
 } // namespace
@@ -141,6 +140,13 @@ extern "C" {
         throw Exit{status};
     }
     __real_exit(status);
+}
+
+// writestandard(int, std::string_view)
+void __wrap__Z13writestandardiSt17basic_string_viewIcSt11char_traitsIcEE(int /*fd*/,
+                                                                         std::string_view text)
+{
+    said += text;
 }
 
 } // extern "C"

@@ -18,6 +18,9 @@
 
 #include <fcntl.h>
 #include <pthread.h>
+#include <sys/resource.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "daemontest.h"
@@ -35,10 +38,7 @@ public:
         if (pipe2(ends.data(), O_NONBLOCK) != 0) {
             throw std::runtime_error("no pipe");
         }
-        for (ssize_t put = 0; (put = write(ends[1], kFiller.data(), kFiller.size())) > 0;) {
-            filling += static_cast<std::size_t>(put);
-        }
-        fcntl(ends[1], F_SETFL, 0);
+        fill();
     }
 
     ~FullPipe()
@@ -48,6 +48,16 @@ public:
     }
     FullPipe(const FullPipe&) = delete;
     FullPipe& operator=(const FullPipe&) = delete;
+
+    void fill()
+    {
+        fcntl(ends[1], F_SETFL, O_NONBLOCK);
+        filling = 0;
+        for (ssize_t put = 0; (put = write(ends[1], kFiller.data(), kFiller.size())) > 0;) {
+            filling += static_cast<std::size_t>(put);
+        }
+        fcntl(ends[1], F_SETFL, 0);
+    }
 
     // Becomes standard output or standard error.
     void become(int fd) const { dup2(ends[1], fd); }
@@ -378,9 +388,11 @@ TEST_F(StandardOutput, UnreadPipeIsWaitedForOnceAndThenLeftOut)
     world.readerneverreads = true;
     wdLocalLog::LogMessage("m", kLevelInfo, "one");
     wdLocalLog::LogMessage("m", kLevelInfo, "two");
-    EXPECT_EQ(world.events(), lines({"wait 5000 ms for 1", "INFO one", "wait 0 ms for 1", //
-                                     "INFO two"}));
+    const std::string events = world.events();
     output.drain();
+    std::vector<std::string> expected(10, "wait 500 ms");
+    expected.insert(expected.end(), {"INFO one", "INFO two"});
+    EXPECT_EQ(events, lines(expected));
     EXPECT_EQ(output.text(), "");
 }
 
@@ -392,10 +404,13 @@ TEST_F(StandardOutput, GoesOnWhenThePipeIsReadAgain)
     wdLocalLog::LogMessage("m", kLevelInfo, "one");
     output.drain();
     wdLocalLog::LogMessage("m", kLevelInfo, "two");
-    EXPECT_EQ(output.text(), "Mon Nov 16 03:19:16 2026 INFO m|TID" + tid() + " two\n");
+    const std::string text = output.text();
+    output.fill();
     world.recordpolls = true;
     wdLocalLog::LogMessage("m", kLevelInfo, "three"); // patience has come back
-    EXPECT_NE(world.events().find("wait 5000 ms for 1\n"), std::string::npos);
+    output.drain();
+    EXPECT_EQ(text, "Mon Nov 16 03:19:16 2026 INFO m|TID" + tid() + " two\n");
+    EXPECT_NE(world.events().find("wait 500 ms\n"), std::string::npos);
 }
 
 TEST_F(StandardOutput, SlowReaderGetsEverything)
@@ -452,7 +467,98 @@ TEST_F(StandardOutput, PipeWithoutReaderIsReplacedByNull)
     EXPECT_EQ(status, exited(7));
 }
 
+TEST_F(StandardOutput, StandardErrorOnTheSamePipeIsReplacedWithIt)
+{
+    FullPipe output;
+    const int before = dup(STDERR_FILENO);
+    output.become(STDOUT_FILENO);
+    output.become(STDERR_FILENO);
+    output.leave();
+    wdLocalLog::LogMessage("m", kLevelInfo, "heard by nobody");
+    const auto errors = std::filesystem::read_symlink("/proc/self/fd/2");
+    dup2(before, STDERR_FILENO);
+    close(before);
+    EXPECT_EQ(errors, "/dev/null");
+}
+
+// Of a terminal only the first byte of a line is sure to have room.
+TEST_F(StandardOutput, TerminalThatNobodyReadsHoldsNobodyUp)
+{
+    const int master = posix_openpt(O_RDWR | O_NOCTTY);
+    ASSERT_EQ(grantpt(master), 0);
+    ASSERT_EQ(unlockpt(master), 0);
+    const int terminal = open(ptsname(master), O_RDWR | O_NOCTTY);
+    ASSERT_GE(terminal, 0);
+    const int before = dup(STDOUT_FILENO);
+    dup2(terminal, STDOUT_FILENO);
+    world.readerneverreads = true;
+    constexpr int kMessages = 2000;
+    for (int i = 0; i < kMessages; ++i) {
+        wdLocalLog::LogMessage("m", kLevelInfo, "text");
+    }
+    dup2(before, STDOUT_FILENO);
+    for (const int fd : {before, terminal, master}) {
+        close(fd);
+    }
+    const std::string text = log();
+    EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), kMessages);
+}
+
+TEST_F(StandardOutput, SocketThatNobodyReadsHoldsNobodyUpAndIsReplacedWhenItsReaderGoes)
+{
+    std::array<int, 2> ends{};
+    ASSERT_EQ(socketpair(AF_UNIX, SOCK_STREAM, 0, ends.data()), 0);
+    dup2(ends[1], STDOUT_FILENO);
+    close(ends[1]);
+    world.readerneverreads = true;
+    const std::string message(100'000, '.');
+    for (int i = 0; i < 5; ++i) {
+        wdLocalLog::LogMessage("m", kLevelInfo, message);
+    }
+    close(ends[0]);
+    wdLocalLog::LogMessage("m", kLevelInfo, "heard by nobody");
+    EXPECT_EQ(std::filesystem::read_symlink("/proc/self/fd/1"), "/dev/null");
+    EXPECT_NE(log().find("heard by nobody\n"), std::string::npos);
+}
+
+using LogThatIsAPipe = LocalLog;
+
+TEST_F(LogThatIsAPipe, HoldsNobodyUpWhenItIsNotRead)
+{
+    ASSERT_EQ(mkfifo(folder.path("pipe").c_str(), 0600), 0);
+    const int reader = open(folder.path("pipe").c_str(), O_RDONLY | O_NONBLOCK);
+    wdLocalLog::logFilePath = folder.path("pipe");
+    world.readerneverreads = true;
+    const std::string message(100'000, '.');
+    wdLocalLog::LogMessage("m", kLevelInfo, message);
+    wdLocalLog::LogMessage("m", kLevelInfo, message);
+    wdLocalLog::logFilePath = folder.path("log");
+    close(reader);
+    EXPECT_NE(takestdout().find(message + "\n"), std::string::npos);
+}
+
 using LocalLogDeath = LocalLog;
+
+TEST_F(LocalLogDeath, PipeWithoutReaderCannotBeOpened)
+{
+    ASSERT_EQ(mkfifo(folder.path("pipe").c_str(), 0600), 0);
+    wdLocalLog::logFilePath = folder.path("pipe");
+    EXPECT_EXIT(wdLocalLog::LogMessage("m", kLevelInfo, "x"), ::testing::ExitedWithCode(200),
+                "^Unable to open the log file\n$");
+}
+
+TEST_F(LocalLogDeath, FileAtItsSizeLimitDoesNotEndTheProcess)
+{
+    const rlimit onebyte{1, 1};
+    EXPECT_EXIT(
+        {
+            setrlimit(RLIMIT_FSIZE, &onebyte);
+            wdLocalLog::LogMessage("m", kLevelInfo, "x");
+            wdLocalLog::LogMessage("m", kLevelInfo, "x");
+            _exit(7);
+        },
+        ::testing::ExitedWithCode(7), "");
+}
 
 TEST_F(LocalLogDeath, FullStandardErrorDoesNotKeepTheProcessFromEnding)
 {

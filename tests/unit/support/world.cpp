@@ -226,7 +226,7 @@ int __wrap_poll(pollfd* streams, nfds_t count, int timeout)
 {
     auto& world = World::current();
     if (world.recordpolls) {
-        world.record("wait " + std::to_string(timeout) + " ms for " + std::to_string(streams->fd));
+        world.record("wait " + std::to_string(timeout) + " ms");
     }
     const bool waits = timeout != 0 && !world.readerneverreads;
     return __real_poll(streams, count, waits ? -1 : 0);
