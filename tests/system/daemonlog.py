@@ -6,7 +6,8 @@ module other than the thread's own as "LEVEL [module] text":
 
     # a comment
     DEBUG General ping sleep 10
-    +30 DEBUG Entering ...   at least 30 seconds of the daemon's clock after the line before
+    +30 DEBUG Entering ...   at least 30 seconds of the daemon's clock after the line before; how
+                             long at most is for the unit tests to say, which have no real clock
     ...                      any lines, or none
     ! ERROR Try ...          nowhere in this thread's log
 
@@ -22,7 +23,8 @@ import time
 LINE = re.compile(r"(\w{3} \w{3} [ \d]\d \d\d:\d\d:\d\d \d{4}) (\w*) ([^|]*)\|TID(\d+) (.*)")
 NAMED = "INFO Name of the service being monitored: "
 ENTRY = "DEBUG This is the entry of threadfunc"
-OWN_MODULES = ("wdmonitorthread", "wdmanager")
+OWN_MODULE = "wdmonitorthread"
+MANAGERS_MODULE = "wdmanager"
 
 # The clock is read before the line is written, in whole seconds.
 CLOCK_SECONDS = 1
@@ -33,24 +35,39 @@ class Line:
     """One message."""
 
     seconds: float
-    text: str  # "LEVEL text" or "LEVEL [module] text"
+    level: str
+    module: str
+    message: str
     thread: int  # the log's id; several threads may have it, one after another
-    owner: str = ""  # "manager", or the service that the thread watches
+    owner: str = "manager"  # or the service that the thread watches
+
+    @property
+    def text(self):
+        """As a scenario expects it: "LEVEL text" or "LEVEL [module] text"."""
+        own = MANAGERS_MODULE if self.owner == "manager" else OWN_MODULE
+        return self.plain if self.module == own else f"{self.level} [{self.module}] {self.message}"
+
+    @property
+    def plain(self):
+        """Without the module."""
+        return f"{self.level} {self.message}"
+
+
+class Torn(Exception):
+    """A line of the log is not one message."""
 
 
 def parsed(text):
-    """The lines of a log, with their owners; what does not start a message continues one."""
+    """The lines of a log, with their owners. All must be whole: no message here has two lines."""
     lines = []
-    for raw in text.splitlines():
+    # The daemon was killed: what stands behind the last newline can be a part of a line.
+    for raw in text.split("\n")[:-1]:
         match = LINE.fullmatch(raw)
-        if not match:
-            if lines:
-                lines[-1].text += "\n" + raw
-            continue
+        if not match or LINE.search(match[5]):
+            raise Torn(raw)
         when, level, module, thread, message = match.groups()
-        origin = "" if module in OWN_MODULES else f"[{module}] "
         seconds = time.mktime(time.strptime(when))
-        lines.append(Line(seconds, f"{level} {origin}{message}", int(thread)))
+        lines.append(Line(seconds, level, module.rstrip(), message, int(thread)))
     _find_owners(lines)
     return lines
 
@@ -59,13 +76,13 @@ def _find_owners(lines):
     owners = {}
     pending = {}  # lines of a thread before it has said whom it watches
     for line in lines:
-        if line.text == ENTRY:
+        if line.plain == ENTRY:
             owners.pop(line.thread, None)
             pending[line.thread] = []
         if line.thread in pending:
             pending[line.thread].append(line)
-            if line.text.startswith(NAMED):
-                owners[line.thread] = line.text[len(NAMED):]
+            if line.plain.startswith(NAMED):
+                owners[line.thread] = line.plain[len(NAMED):]
                 for early in pending.pop(line.thread):
                     early.owner = owners[line.thread]
         else:
@@ -83,6 +100,8 @@ class Wanted:
         delayed = re.fullmatch(r"\+(\d+) (.*)", self.text)
         if delayed:
             self.pause, self.text = int(delayed[1]), delayed[2]
+            if self.pause <= CLOCK_SECONDS:
+                raise ValueError(f"a pause that the clock cannot show: {delayed[0]}")
         self.text = self.text.replace("{blank}", " ")
         pattern = re.escape(self.text).replace(r"\{n\}", r"\d+").replace(r"\{any\}", ".*")
         self.pattern = re.compile(pattern, re.DOTALL)
@@ -125,6 +144,8 @@ def expectations(text):
 def difference(section, lines):
     """How the log differs from what the section expects, to be read; empty where it does not."""
     own = [line for line in lines if line.owner == section.owner]
+    if not own:
+        return f"[{section.owner}] has logged nothing"
     for wanted in section.forbidden:
         for line in own:
             if wanted.pattern.fullmatch(line.text):

@@ -31,24 +31,25 @@ def intruders(lines):
     """
     found = []
     for first, line in enumerate(lines):
-        if line.text != ENTERED:
+        if line.plain != ENTERED:
             continue
         own = [i for i in range(first, len(lines)) if lines[i].thread == line.thread]
-        ends = [place for place, i in enumerate(own) if lines[i].text == LEFT]
+        ends = [place for place, i in enumerate(own) if lines[i].plain == LEFT]
         last = own[ends[0] - 1] if ends else own[-1]
-        found += [f"during the recovery of {line.owner}: {other.owner}: {other.text}"
+        found += [f"during the recovery of {line.owner}: {other.owner}: {other.plain}"
                   for other in lines[first:last + 1]
-                  if other.thread != line.thread and other.text.startswith(UNDER_LOCK)]
+                  if other.thread != line.thread and other.plain.startswith(UNDER_LOCK)]
     return found
 
 
-def changes(command):
-    """Whether a command starts or stops something, rather than asks."""
-    return command.startswith("service ") and not command.endswith(" status")
-
-
 def asks(command):
+    """Whether a command is a status command or a check."""
     return command.startswith("redis-cli ") or command.endswith(" status")
+
+
+def changes(command):
+    """Whether a command starts or stops something."""
+    return not asks(command) and not command.startswith(("pidof ", "touch "))
 
 
 def overlaps(journal):

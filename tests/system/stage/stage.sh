@@ -12,7 +12,7 @@ readonly tolkwd=/opt/tolkwd/tolkwd
 speed=20          # how many of the daemon's seconds pass in one second; "real": the clock is left
                   # alone; "file": it is as the file of FAKETIME_TIMESTAMP_FILE says
 refresh=10800     # its refresh period, in its own seconds
-patience=120      # how long `await` and `until_true` wait, in seconds
+patience=${PATIENCE:-120} # how long `await` and `until_true` wait, in seconds
 daemon=           # process id of the daemon
 cursor=0          # lines of the log that `await` has passed
 
@@ -58,15 +58,21 @@ until_true() {
     done
 }
 
+# line_with TEXT: the number of the next line of the log, behind the one awaited last, that holds it.
+line_with() {
+    [ ! -e "$log" ] || TEXT=$1 awk -v cursor="$cursor" \
+        'NR > cursor && index($0, ENVIRON["TEXT"]) { print NR; exit }' "$log"
+}
+
 # await TEXT: waits for the next line of the log, behind the one awaited last, that holds TEXT.
 await() {
     local deadline=$((SECONDS + patience)) found
-    until found=$(tail -n "+$((cursor + 1))" "$log" 2>/dev/null | grep -nFm1 -- "$1"); do
+    until found=$(line_with "$1") && [ -n "$found" ]; do
         [ "$SECONDS" -lt "$deadline" ] || fail "not in the log after $patience s: $1"
         runs || fail "the daemon has ended before it logged: $1"
         sleep 0.05
     done
-    cursor=$((cursor + ${found%%:*}))
+    cursor=$found
 }
 
 # Whether the daemon runs.
@@ -75,7 +81,7 @@ runs() { kill -0 "$daemon" 2>/dev/null; }
 # Waits until the daemon, which should do nothing but pause, has paused twice more.
 pauses_twice() {
     local before
-    until_true grep -qx tolkwd "/proc/$daemon/comm"
+    until_true grep -qE '^(tolkwd|memcheck.*)$' "/proc/$daemon/comm"
     until_true grep -q '^State:.S' "/proc/$daemon/status"
     before=$(pauses)
     until_true paused_since $((before + 2))
@@ -185,6 +191,7 @@ everything_runs() {
 as_nobody() {
     chmod 755 "${tolkwd%/*}"
     chown nobody "$ping_folder" /opt/results
+    chmod 1777 /tmp
     run_as=(setpriv --reuid nobody --clear-groups "$@")
 }
 

@@ -1,5 +1,5 @@
-# Somebody sets the clock back by a day: pauses are as long as before, outages are found and
-# mended, and a negative CPU figure is no load.
+# Somebody sets the clock back by an hour, while redis-server is busy: the CPU figure of that time is
+# negative, and no load. Pauses are as long as before; outages are found and mended.
 start redis-server
 redis=$(pid_of redis-server)
 FAKETIME_TIMESTAMP_FILE=/run/clock
@@ -8,15 +8,15 @@ echo '+0 x20' >/run/clock
 speed='file'
 watch
 await 'Threshold is not reached'
+redis-benchmark -q -l -P 100 -t get >/dev/null &
+load=$!
+await 'Threshold is reached'
+echo '-1h x20' >/run/clock.new && mv /run/clock.new /run/clock
+await 'averageCPUUsage/Threshold:-'
 await 'Threshold is not reached'
-echo '-1d x20' >/run/clock.new && mv /run/clock.new /run/clock
-await 'averageCPUUsage/Threshold:'
-await 'averageCPUUsage/Threshold:'
-await 'Threshold is not reached'
+kill -KILL "$load"
+wait "$load" || true
 slay redis-server
 await 'has been general recoverred successfully.'
 unwatch
 was_restarted redis-server "$redis"
-before=$(head -n 1 "$log" | cut -c 1-24)
-after=$(tail -n 1 "$log" | cut -c 1-24)
-[ "$(date -d "$after" +%s)" -lt "$(date -d "$before" +%s)" ] || fail 'the clock was not set back'

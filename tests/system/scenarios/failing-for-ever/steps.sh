@@ -1,12 +1,11 @@
 # nginx is stopped and its configuration is broken: no start helps. After two recoveries it is given
 # up. Somebody mends the configuration; the next refresh, and no earlier event, brings nginx back.
 speed=40
-refresh=900
+refresh=1800
 start nginx
 watch
 await 'General ping successful!'
 stop nginx
-touch /run/nginx.pid.broken
 mkdir /run/nginx-broken
 mount --bind /run/nginx-broken /var/log/nginx && mount -o remount,bind,ro /var/log/nginx
 await 'Failed to general recover the sevice nginx after try the max times.'

@@ -4,7 +4,7 @@ mkdir /run/small
 mount -t tmpfs -o size=256k tmpfs /run/small
 become_tolkwd -i "$configuration" -l /run/small/tolkwd.log -g >/opt/results/stdout 2>"$errors" &
 daemon=$!
-until_true grep -q 'General ping successful!' /run/small/tolkwd.log
+until_true grep -qs 'General ping successful!' /run/small/tolkwd.log
 dd if=/dev/zero of=/run/small/filling bs=1k 2>/dev/null || true
 size=$(stat -c %s /run/small/tolkwd.log)
 said=$(grep -c 'General ping successful!' /opt/results/stdout)
@@ -19,4 +19,5 @@ rm /run/small/filling
 logged=$(grep -c 'General ping successful!' /run/small/tolkwd.log)
 until_true more_than "$logged" 'General ping successful!' /run/small/tolkwd.log
 unwatch
+grep -F '|TID' /opt/results/stdout >"$log" # every line of the daemon, whole
 [ ! -s "$errors" ] || fail 'it complained'

@@ -16,4 +16,4 @@ watch
 await 'General ping successful!'
 prlimit --pid "$daemon" --nofile=3:
 ends_with 200
-is 'Unable to open the log file' "$(cat "$errors")"
+is 1 "$(grep -cx 'Unable to open the log file' "$errors")"

@@ -7,8 +7,9 @@ as_nobody prlimit --nproc=1000
 watch
 await 'agent.web, result = web is running., state = 0'
 await 'agent.db, result = db is running., state = 0'
-rm "$ping_folder/agent.db"
 limit_processes 0
+await 'agent.db, result = db is running., state = 127'
+rm "$ping_folder/agent.db"
 await 'agent.web, result = web is running., state = 127'
 await 'agent.db, result = , state = 127'
 await 'Unable to fetch stats of process from system'

@@ -14,4 +14,4 @@ await 'General ping successful!'
 unwatch
 exec 8</run/pipe 7<&-
 read -r first <&8
-holds "$log" "$first"
+grep -qxF -- "$first" "$log" || fail "not a line of the log: $first"

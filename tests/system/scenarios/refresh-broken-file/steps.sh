@@ -10,22 +10,33 @@ cp "$configuration" /run/good.xml
 watch
 await 'General ping successful!'
 
+# broken WHAT: the file is what it is; waits until a generation has lived on it, and mends it.
 broken() {
+    local loaded
     say "$1"
-    await 'join threadas*' # it has met the good file: its threads end
+    await 'join threadas*' # the threads that the good file had end, and this one is read
     await 'after join......'
-    await 'join threadas*' # and the broken one
-    cp /run/good.xml "$configuration"
+    loaded=$cursor
+    await 'join threadas*'
+    ! sed -n "$loaded,${cursor}p" "$log" | grep -q 'Name of the service being monitored' ||
+        fail 'it watched something'
+    cp /run/good.xml /run/new.xml
+    mv /run/new.xml "$configuration"
     await 'Name of the service being monitored: web'
     await 'General ping successful!'
 }
+# becomes: the configuration becomes standard input, in one step.
+becomes() {
+    cat >/run/new.xml
+    mv /run/new.xml "$configuration"
+}
 
-: >"$configuration"
+becomes </dev/null
 broken 'an empty file'
-gzip -c /run/good.xml >"$configuration"
+gzip -c /run/good.xml | becomes
 broken garbage
 lacks "$log" 'Loadservices error.'
-sed 's|<stopcmd>NULL</stopcmd>|<stopcmd/>|' /run/good.xml >"$configuration"
+sed 's|<stopcmd>NULL</stopcmd>|<stopcmd/>|' /run/good.xml | becomes
 broken 'an empty tag'
 grep -q 'ERROR wdmanager.* Loadservices error.$' "$log" || fail 'the load did not fail'
 lacks "$errors" 'unable to open'

@@ -1,5 +1,6 @@
 # nginx is killed, and an operator starts it again while the daemon still retries: nothing more is
 # done, and this round has no check.
+speed=10
 start nginx
 watch
 await 'General ping successful!'

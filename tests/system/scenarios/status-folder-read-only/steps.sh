@@ -6,6 +6,6 @@ echo 'cron is running' >"$ping_folder/agent.cron"
 mount --bind "$ping_folder" "$ping_folder"
 mount -o remount,bind,ro "$ping_folder"
 watch
-await 'agent.cron, result = cron is running, state = 2'
-await 'Try to general ping more times now'
+until_true grep -qsF 'agent.cron, result = cron is running, state = 2' "$log"
+until_true grep -qF 'Try to general ping more times now' "$log"
 unwatch
