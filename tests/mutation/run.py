@@ -36,7 +36,7 @@ CONFIGURE = ["cmake", "--preset", "debug", "-DBUILD_TESTING=ON", "-DCMAKE_CXX_FL
 
 # Each kind of tests, and how long all of them may take together. A mutant that hangs is caught by
 # this bound; one that never stops growing is caught by the other.
-TEST_SECONDS = {"unit": 60, "system": 300}
+TEST_SECONDS = {"unit": 60, "system": 600}
 TEST_MEMORY_BYTES = 4 << 30
 
 FAILED_TEST = re.compile(r"Test +#\d+: (\S+) .*\*\*\*")
@@ -148,7 +148,12 @@ def catch(folder, module):
         caught = run_tests(folder, "unit", rf"^{module}\.")
     if not caught:
         build(folder)
-        caught = run_tests(folder, "unit") or run_tests(folder, "system")
+        caught = run_tests(folder, "unit")
+    if not caught and (caught := run_tests(folder, "system")):
+        # A busy machine can do that, too: whoever catches it has to catch it again.
+        caught = run_tests(folder, "system")
+        if caught == TIME_OUT:
+            raise Fault("the system tests take too long to tell")
     return caught
 
 
