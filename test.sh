@@ -1,6 +1,8 @@
 #!/usr/bin/env bash
 # Sets up, builds with warnings as errors, and runs all tests: under the address and undefined-
-# behaviour sanitizers, under the thread sanitizer, and as released; then lets each fuzzer run.
+# behaviour sanitizers, under the thread sanitizer, and as released; then lets each fuzzer run. Takes
+# about a quarter of an hour. Longer fuzzing: tests/fuzz/CMakeLists.txt; the whole soak:
+# tests/system/CMakeLists.txt; valgrind: tests/memcheck.sh; mutants: tests/mutation/run.py.
 set -euo pipefail
 # shellcheck source=scripts/setup.sh
 . "$(dirname "$0")/scripts/setup.sh"
@@ -11,3 +13,6 @@ for preset in asan tsan release fuzz; do
     build "$preset" -DTOLKWD_WERROR=ON -DBUILD_TESTING=ON
     (cd "$root" && ctest --preset "$preset")
 done
+
+printf '\n== what the soak measured\n'
+grep -h ' refreshes, ' "$root/build/release/Testing/Temporary/LastTest.log"
