@@ -14,7 +14,8 @@ build=$root/build/debug
 output=$(mktemp)
 trap 'rm -f "$output"' EXIT
 
-check=(valgrind --quiet --error-exitcode=9 --leak-check=full --errors-for-leak-kinds=definite
+# Fair, because some tests wait for other threads by yielding to them.
+check=(valgrind --quiet --fair-sched=yes --error-exitcode=9 --leak-check=full --errors-for-leak-kinds=definite
     --suppressions="$root/tests/memcheck.supp")
 for test in "$build"/tests/unit/*_test; do
     printf '== %s\n' "${test##*/}"

@@ -100,6 +100,8 @@ void World::reset(const std::string& folder, const std::string& module)
     existing.clear();
     files.clear();
     onrealproc = nullptr;
+    onexit = [] {
+    };
     recordpolls = false;
     readerneverreads = false;
     recordopens = false;
@@ -167,6 +169,7 @@ int __real_open(const char* path, int flags, ...);
 int __real_poll(pollfd* streams, nfds_t count, int timeout);
 int __real_pthread_create(pthread_t* id, const pthread_attr_t* attributes, void* (*body)(void*),
                           void* argument);
+[[noreturn]] void __real__exit(int status);
 [[noreturn]] void __real_pthread_exit(void* value);
 int __real_pthread_join(pthread_t id, void** value);
 int __real_pthread_rwlock_destroy(pthread_rwlock_t* lock);
@@ -174,6 +177,12 @@ int __real_pthread_rwlock_init(pthread_rwlock_t* lock, const pthread_rwlockattr_
 int __real_pthread_rwlock_rdlock(pthread_rwlock_t* lock);
 int __real_pthread_rwlock_unlock(pthread_rwlock_t* lock);
 int __real_pthread_rwlock_wrlock(pthread_rwlock_t* lock);
+
+[[noreturn]] void __wrap__exit(int status)
+{
+    World::current().onexit();
+    __real__exit(status);
+}
 
 int __wrap_access(const char* path, int /*mode*/)
 {

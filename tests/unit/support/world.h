@@ -58,6 +58,8 @@ public:
     std::map<std::string, std::string> files; // for fopen() of paths below /proc/
     std::function<void()> onrealproc;         // fopen() opens the real ones, then calls this
 
+    std::function<void()> onexit; // called before _exit() ends the process
+
     bool recordpolls = false;      // write poll() down
     bool readerneverreads = false; // poll() does not wait; else it waits for as long as it takes
     bool recordopens = false;      // write open() down, with what matters of its flags
