@@ -613,9 +613,11 @@ TEST_F(LocalLogDeath, OnlyTheFirstThreadSpeaks)
         {
             constexpr std::size_t kThreads = 20;
             // The process ends only when all others wait for that, the one that joins them
-            // included.
-            world.onexit = [] {
-                await([] { return sleepingthreads() >= kThreads; });
+            // included, or when a second thread has spoken.
+            std::atomic<int> ending = 0;
+            world.onexit = [&ending] {
+                ++ending;
+                await([&] { return ending > 1 || sleepingthreads() >= kThreads; });
             };
             wdLocalLog::logFilePath = folder.path("missing/log");
             std::vector<std::thread> threads(kThreads);
