@@ -14,8 +14,7 @@ build=$root/build/debug
 output=$(mktemp)
 trap 'rm -f "$output"' EXIT
 
-# Fair, because some tests wait for other threads by yielding to them.
-check=(valgrind --quiet --fair-sched=yes --error-exitcode=9 --leak-check=full --errors-for-leak-kinds=definite
+check=(valgrind --quiet --error-exitcode=9 --leak-check=full --errors-for-leak-kinds=definite
     --suppressions="$root/tests/memcheck.supp")
 for test in "$build"/tests/unit/*_test; do
     printf '== %s\n' "${test##*/}"
