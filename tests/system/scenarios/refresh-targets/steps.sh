@@ -37,7 +37,7 @@ is "$(of_generations '[*]:' '******************************:')" \
     "$(of_generations 'monitored: ' 'Name of the service being monitored: ')"
 
 # A thread that is told to end pings once more at the most.
-late=$(awk '/join threadas/ { ending = 1 } /after join/ { ending = 0 }
+late=$(awk '/join threadas/ { ending = 1 } /after join|entry of threadfunc/ { ending = 0 }
     ending && /enter of general ping/ { if (++pings[$7] > 1) print }
     !ending { split("", pings) }' "$log")
 is '' "$late"
