@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # memcheck.sh: everything under valgrind's memcheck, once: each unit test, then the daemon in the
-# scenarios. Takes about ten minutes. Ends with 1 at any error or leak.
+# scenarios. Takes about a quarter of an hour. Ends with 1 at any error or leak.
 #
 # Left out are the soak, whose figures would be valgrind's, and what valgrind itself cannot live
 # with: no-descriptors and output-closed take away the descriptors that it needs.
