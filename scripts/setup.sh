@@ -29,8 +29,9 @@ missing_packages() {
     done <"$root/scripts/packages.txt"
 }
 
-# Services that the demonstration and the tests alone need. Where their packages bring them, they are neither
-# started nor enabled at boot; where the machine had them before, they are left as they are.
+# Services that the demonstration and the tests alone need. Where their packages bring them, they
+# are neither started nor enabled at boot; where the machine had them before, they are left as they
+# are.
 readonly demo_services=(cron nginx redis-server)
 readonly guard=/usr/sbin/policy-rc.d
 readonly guard_mark='# made by the setup of tolkwd, for the time of an installation'
