@@ -8,10 +8,12 @@
 #include <csignal>
 #include <ctime>
 #include <mutex>
+#include <optional>
 
 #include <fcntl.h>
 #include <poll.h>
 #include <pthread.h>
+#include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -64,14 +66,27 @@ private:
 // of it the last time.
 struct sink {
     enum manner {
-        kPlain,  // its writes do not wait: a file, or opened so
-        kSocket, // each write has to say that it shall not wait
+        kFile,   // has places to seek to: its writes do not wait, and it has no reader
+        kPlain,  // its writes do not wait: it was opened so
+        kSocket, // each write has to say that it shall not wait, nor raise a signal
         kAsked,  // it could wait, so it is asked for room before each write
     };
     int fd;
     manner how;
+    bool raises;              // a failing write can raise one of the guard's signals
     std::atomic<bool>& stuck; // its reader had stopped reading
 };
+
+bool filesarelimited()
+{
+    rlimit limit{};
+    return getrlimit(RLIMIT_FSIZE, &limit) != 0 || limit.rlim_cur != RLIM_INFINITY;
+}
+
+bool isfile(int fd)
+{
+    return lseek(fd, 0, SEEK_CUR) >= 0;
+}
 
 bool hasroom(int fd, int milliseconds)
 {
@@ -101,7 +116,10 @@ ssize_t writesome(const sink& to, std::string_view text)
 // number of what kept the text, or the rest of it, from being written.
 int deliver(const sink& to, std::string_view text)
 {
-    const writesignalguard guard;
+    std::optional<writesignalguard> guard;
+    if (to.raises) {
+        guard.emplace();
+    }
     int patience = to.stuck ? 0 : kReaderPatienceMilliseconds;
     while (!text.empty()) {
         const ssize_t written = writesome(to, text);
@@ -115,12 +133,42 @@ int deliver(const sink& to, std::string_view text)
         } else if (errno != EINTR) {
             const int error = errno;
             to.stuck = error == EAGAIN;
-            guard.takesignal();
+            if (guard) {
+                guard->takesignal();
+            }
             return error;
         }
     }
-    to.stuck = false;
+    if (to.stuck) { // only then, for all threads share it
+        to.stuck = false;
+    }
     return 0;
+}
+
+// A write that waits for room in a pipe or a terminal cannot be interrupted, and O_NONBLOCK set on
+// the descriptor would be set for whoever else has it. So these are opened anew, for one line.
+sink streamsink(int fd, std::atomic<bool>& stuck)
+{
+    struct stat kind {};
+    fstat(fd, &kind);
+    if (S_ISSOCK(kind.st_mode)) {
+        return {fd, sink::kSocket, false, stuck};
+    }
+    if (!S_ISFIFO(kind.st_mode) && isatty(fd) != 1) {
+        return {fd, sink::kPlain, true, stuck};
+    }
+    const std::string path = "/proc/self/fd/" + std::to_string(fd);
+    const int own = open(path.c_str(), O_WRONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
+    if (own < 0) {
+        return {fd, sink::kAsked, true, stuck}; // another user's, or no descriptor left
+    }
+    return {own, sink::kPlain, true, stuck};
+}
+
+// How to write to standard output or standard error; its `fd` is to be closed where it is another.
+sink standardsink(int fd, std::atomic<bool>& stuck)
+{
+    return isfile(fd) ? sink{fd, sink::kFile, filesarelimited(), stuck} : streamsink(fd, stuck);
 }
 
 // Nobody will read this stream again. A service that is started with it would be killed by the
@@ -176,16 +224,26 @@ int openlog(int extraflags)
     return fd;
 }
 
+// The log as it is opened for one message.
+struct openedlog {
+    int fd;
+    sink::manner how;
+};
+
 // The file is emptied, never rotated, and opened for appending again: without O_APPEND the lines
 // of two threads that both empty it would overwrite each other.
-int openlogwithinlimit()
+openedlog openlogwithinlimit()
 {
     const int fd = openlog(0);
-    if (lseek(fd, 0, SEEK_END) <= kLogLimitBytes) {
-        return fd;
+    const off_t size = lseek(fd, 0, SEEK_END);
+    if (size < 0) {
+        return {fd, sink::kPlain}; // a pipe or a terminal
+    }
+    if (size <= kLogLimitBytes) {
+        return {fd, sink::kFile};
     }
     close(fd);
-    return openlog(O_TRUNC);
+    return {openlog(O_TRUNC), sink::kFile};
 }
 
 std::string_view levelword(int level)
@@ -202,43 +260,64 @@ std::string_view levelword(int level)
     }
 }
 
-// The fixed 24 characters of asctime, without its newline.
-std::string timetext(std::time_t when)
+using asctimetext = std::array<char, kAsctimeBytes>;
+
+asctimetext asctimeof(std::time_t when)
 {
     std::tm local{};
     localtime_r(&when, &local);
-    std::array<char, kAsctimeBytes> text{};
+    asctimetext text{};
     asctime_r(&local, text.data());
-    const std::string_view line(text.data(), text.size());
-    return std::string(line.substr(0, line.find_first_of(std::string_view("\n\0", 2))));
+    return text;
+}
+
+// What a line needs besides its message. Finding it out takes as long as writing the line, and it
+// hardly ever changes but for the time: each thread looks once a second.
+struct circumstances {
+    std::time_t second;
+    asctimetext date;
+    bool outputisfile; // standard output is
+    bool filesarelimited;
+
+    // Valid until this thread's next call.
+    static const circumstances& at(std::time_t now)
+    {
+        thread_local std::optional<circumstances> last;
+        if (!last || last->second != now) {
+            last = {now, asctimeof(now), isfile(STDOUT_FILENO), ::filesarelimited()};
+        }
+        return *last;
+    }
+};
+
+// The date is asctime's 24 characters, without its newline.
+std::string composeline(const asctimetext& date, int level, std::string_view module,
+                        std::string_view message)
+{
+    constexpr std::size_t kBesides = 64; // date, level word, thread id and what stands between
+    const std::string_view when(date.data(), date.size());
+    std::string line;
+    line.reserve(kBesides + module.size() + message.size());
+    line.append(when.substr(0, when.find_first_of(std::string_view("\n\0", 2))));
+    line.append(" ").append(levelword(level)).append(" ").append(module);
+    line.append("|TID").append(std::to_string(pthread_self()));
+    line.append(" ").append(message).append("\n");
+    return line;
 }
 
 } // namespace
 
-// A write that waits for room in a pipe or a terminal cannot be interrupted, and O_NONBLOCK set on
-// the descriptor would be set for whoever else has it. So these are opened anew, for one line.
 void writestandard(int fd, std::string_view text)
 {
     static std::mutex turn; // keeps the lines of two threads apart
     static std::array<std::atomic<bool>, STDERR_FILENO + 1> stuck{};
     const std::scoped_lock lock(turn);
-    sink to{fd, sink::kPlain, stuck.at(static_cast<std::size_t>(fd))};
-    int own = -1;
-    struct stat kind {};
-    fstat(fd, &kind);
-    if (S_ISSOCK(kind.st_mode)) {
-        to.how = sink::kSocket;
-    } else if (S_ISFIFO(kind.st_mode) || isatty(fd) == 1) {
-        const std::string path = "/proc/self/fd/" + std::to_string(fd);
-        own = open(path.c_str(), O_WRONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
-        to.fd = own >= 0 ? own : fd;
-        to.how = own >= 0 ? sink::kPlain : sink::kAsked; // another user's, or no descriptor left
-    }
+    const sink to = standardsink(fd, stuck.at(static_cast<std::size_t>(fd)));
     if (deliver(to, text) == EPIPE) {
         replacegonereaders();
     }
-    if (own >= 0) {
-        close(own);
+    if (to.fd != fd) {
+        close(to.fd);
     }
 }
 
@@ -247,18 +326,23 @@ wdLocalLog::wdLocalLog(const std::string& path)
     logFilePath = path;
 }
 
+// Into a file, threads need not take turns: the system does not mix the bytes of two writes.
 void wdLocalLog::LogMessage(std::string module, int level, std::string message)
 {
     static std::atomic<bool> logstuck = false; // only ever true where the log is a pipe or so
+    static std::atomic<bool> neverstuck = false;
     const std::time_t now = time(nullptr);
-    const int fd = openlogwithinlimit();
+    const openedlog log = openlogwithinlimit();
     if (level != kLevelDebug || debugenable) {
-        std::string line = timetext(now);
-        line.append(" ").append(levelword(level)).append(" ").append(module);
-        line.append("|TID").append(std::to_string(pthread_self()));
-        line.append(" ").append(message).append("\n");
-        writestandard(STDOUT_FILENO, line);
-        deliver({fd, sink::kPlain, logstuck}, line);
+        const circumstances& here = circumstances::at(now);
+        const std::string line = composeline(here.date, level, module, message);
+        if (here.outputisfile) {
+            deliver({STDOUT_FILENO, sink::kFile, here.filesarelimited, neverstuck}, line);
+        } else {
+            writestandard(STDOUT_FILENO, line);
+        }
+        const bool raises = log.how != sink::kFile || here.filesarelimited;
+        deliver({log.fd, log.how, raises, logstuck}, line);
     }
-    close(fd);
+    close(log.fd);
 }

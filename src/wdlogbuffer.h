@@ -11,6 +11,7 @@
 #include <string>
 
 #include "wdLocalLog_linux.h"
+#include "wdsettings.h"
 
 // A local object of one message in one thread; it takes no lock and is never copied.
 class WDLogBuffer {
@@ -55,11 +56,16 @@ private:
     std::unique_ptr<std::ostringstream> stream; // once there, every insertion goes here
 };
 
-// Composes `pieces` and writes them as one line; `level` is one of loglevel. Any thread; behaves
-// as wdLocalLog::LogMessage does when the log cannot be opened.
+// Composes `pieces` and writes them as one line; `level` is one of loglevel. A line that will be
+// dropped is not composed, but the log is opened for it all the same. Any thread; behaves as
+// wdLocalLog::LogMessage does when the log cannot be opened.
 template <typename... Pieces>
 void wdlog(const char* module, int level, const Pieces&... pieces)
 {
+    if (level == kLevelDebug && !debugenable) {
+        wdLocalLog::LogMessage(module, level, {});
+        return;
+    }
     WDLogBuffer buffer;
     wdLocalLog::LogMessage(module, level, buffer.str((buffer << ... << pieces)));
 }

@@ -122,7 +122,18 @@ protected:
         DaemonTest::SetUp();
         setenv("TZ", "UTC", 1);
         tzset();
+        looknew();
+    }
+
+    // Makes the next line the first of its second, for which the log looks at the surroundings.
+    void looknew()
+    {
+        world.now = kMoment - 1;
+        wdLocalLog::logFilePath = "/dev/null";
+        wdLocalLog::LogMessage("other", kLevelInfo, "");
+        wdLocalLog::logFilePath = folder.path("log");
         world.now = kMoment;
+        takestdout();
     }
 
     static std::string tid() { return std::to_string(pthread_self()); }
@@ -164,6 +175,18 @@ TEST_F(LocalLog, TimeIsLocal)
     tzset();
     wdLocalLog::LogMessage("m", kLevelInfo, "x");
     EXPECT_EQ(log().substr(0, 24), "Mon Nov 16 08:19:16 2026");
+}
+
+TEST_F(LocalLog, TimeFollowsTheClockForwardsAndBack)
+{
+    for (const int step : {0, 0, 1, 0, -3600}) {
+        world.now = kMoment + step;
+        wdLocalLog::LogMessage("m", kLevelInfo, "x");
+    }
+    const std::string rest = " INFO m|TID" + tid() + " x\n";
+    EXPECT_EQ(log(), "Mon Nov 16 03:19:16 2026" + rest + "Mon Nov 16 03:19:16 2026" + rest +
+                         "Mon Nov 16 03:19:17 2026" + rest + "Mon Nov 16 03:19:16 2026" + rest +
+                         "Mon Nov 16 02:19:16 2026" + rest);
 }
 
 TEST_F(LocalLog, DayOfMonthIsPaddedAsAsctimeDoes)
@@ -403,6 +426,21 @@ TEST_F(StandardOutput, UnreadPipeIsWaitedForOnceAndThenLeftOut)
     EXPECT_EQ(output.text(), "");
 }
 
+TEST_F(StandardOutput, FileThatBecomesAnUnreadPipeIsSeenWithinASecond)
+{
+    wdLocalLog::LogMessage("m", kLevelInfo, "to a file");
+    FullPipe output;
+    output.become(STDOUT_FILENO);
+    world.recordpolls = true;
+    world.readerneverreads = true;
+    ++world.now;
+    wdLocalLog::LogMessage("m", kLevelInfo, "to a pipe");
+    std::vector<std::string> expected(10, "wait 500 ms");
+    expected.insert(expected.begin(), "INFO to a file");
+    expected.emplace_back("INFO to a pipe");
+    EXPECT_EQ(world.events(), lines(expected));
+}
+
 TEST_F(StandardOutput, GoesOnWhenThePipeIsReadAgain)
 {
     FullPipe output;
@@ -545,6 +583,21 @@ TEST_F(LogThatIsAPipe, HoldsNobodyUpWhenItIsNotRead)
     EXPECT_NE(takestdout().find(message + "\n"), std::string::npos);
 }
 
+TEST_F(LogThatIsAPipe, IsWaitedForOnceThoughStandardOutputIsAFile)
+{
+    ASSERT_EQ(mkfifo(folder.path("pipe").c_str(), 0600), 0);
+    const int reader = open(folder.path("pipe").c_str(), O_RDONLY | O_NONBLOCK);
+    const std::string message(100'000, '.');
+    wdLocalLog::logFilePath = folder.path("pipe");
+    world.recordpolls = true;
+    world.readerneverreads = true;
+    wdLocalLog::LogMessage("m", kLevelInfo, message);
+    wdLocalLog::LogMessage("m", kLevelInfo, message);
+    wdLocalLog::logFilePath = folder.path("log");
+    close(reader);
+    EXPECT_EQ(world.events(), lines(std::vector<std::string>(10, "wait 500 ms")));
+}
+
 using LocalLogDeath = LocalLog;
 
 TEST_F(LocalLogDeath, PipeWithoutReaderCannotBeOpened)
@@ -562,6 +615,20 @@ TEST_F(LocalLogDeath, FileAtItsSizeLimitDoesNotEndTheProcess)
         {
             setrlimit(RLIMIT_FSIZE, &onebyte);
             wdLocalLog::LogMessage("m", kLevelInfo, "x");
+            wdLocalLog::LogMessage("m", kLevelInfo, "x");
+            _exit(7);
+        },
+        ::testing::ExitedWithCode(7), "");
+}
+
+TEST_F(LocalLogDeath, SizeLimitSetMeanwhileDoesNotEndTheProcess)
+{
+    const rlimit onebyte{1, 1};
+    EXPECT_EXIT(
+        {
+            wdLocalLog::LogMessage("m", kLevelInfo, "x");
+            setrlimit(RLIMIT_FSIZE, &onebyte);
+            ++world.now;
             wdLocalLog::LogMessage("m", kLevelInfo, "x");
             _exit(7);
         },

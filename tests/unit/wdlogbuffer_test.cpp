@@ -120,4 +120,26 @@ TEST_F(LogHelper, ComposesAndWritesOneLine)
     EXPECT_EQ(world.events(), lines({"ERROR left: 2 of 3", "INFO text only"}));
 }
 
+// Counts how often it is looked at.
+struct CountedPiece {
+    int& count;
+    operator const std::string&() const
+    {
+        static const std::string text = "counted";
+        ++count;
+        return text;
+    }
+};
+
+TEST_F(LogHelper, LineThatIsDroppedIsNotComposed)
+{
+    int count = 0;
+    wdlog("m", kLevelDebug, CountedPiece{count});
+    debugenable = false;
+    wdlog("m", kLevelDebug, CountedPiece{count});
+    wdlog("m", kLevelInfo, CountedPiece{count});
+    EXPECT_EQ(world.events(), lines({"DEBUG counted", "INFO counted"}));
+    EXPECT_EQ(count, 2);
+}
+
 } // namespace
