@@ -11,6 +11,8 @@
 #include <string>
 #include <vector>
 
+#include "wdtext.h"
+
 // Shell commands, process ids and text. No state; every function may be called from any thread.
 class Utility {
 public:
@@ -88,7 +90,7 @@ private:
     int thresholdAverageCPUUsage = 0; // as averageCPUUsage
     int thresholdThreadCount = 0;
     int thresholdMemoryUsage = 0; // pages
-    std::string name;
+    wdtext name;
     int pid = -1;
     int lastRefreshTime = 0; // seconds since the epoch; 0: no baseline yet
     int lastUserTime = 0;    // clock ticks at that time

@@ -10,29 +10,30 @@
 #include <vector>
 
 #include "ProcessStatistics_Linux.h"
+#include "wdtext.h"
 
 // The text that stands for "nothing is configured" in a command. An empty command is not that.
 inline constexpr const char* kNoCommand = "NULL";
 
 // The sixteen texts are named by their configuration keys.
 struct service {
-    std::string name;
-    std::string binarypath; // executable: path or name
-    std::string startcmd;
-    std::string stopcmd;
-    std::string functionalpingcmd;
-    std::string genpinginterval;    // seconds
-    std::string funpinginterval;    // seconds
-    std::string maxattemptofwakeup; // recoveries before the monitor gives up
-    std::string messageformat;      // listed only
-    std::string hackmessagehandler; // kept only
-    std::string sendmessagehandler; // kept only
-    std::string MaxFPSkips;         // functional pings that may be skipped in a row
-    std::string ThresholdAverageCPUUsage;
-    std::string ThresholdMemoryUsage; // pages
-    std::string ThresholdThreadCount;
-    std::string ThresholdHandleCount; // listed only
-    ProcessStatistics statistics;     // of the running process; no configuration key
+    wdtext name;
+    wdtext binarypath; // executable: path or name
+    wdtext startcmd;
+    wdtext stopcmd;
+    wdtext functionalpingcmd;
+    wdtext genpinginterval;    // seconds
+    wdtext funpinginterval;    // seconds
+    wdtext maxattemptofwakeup; // recoveries before the monitor gives up
+    wdtext messageformat;      // listed only
+    wdtext hackmessagehandler; // kept only
+    wdtext sendmessagehandler; // kept only
+    wdtext MaxFPSkips;         // functional pings that may be skipped in a row
+    wdtext ThresholdAverageCPUUsage;
+    wdtext ThresholdMemoryUsage; // pages
+    wdtext ThresholdThreadCount;
+    wdtext ThresholdHandleCount;  // listed only
+    ProcessStatistics statistics; // of the running process; no configuration key
 };
 
 struct wdmonitortarget {

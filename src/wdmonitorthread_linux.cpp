@@ -1,16 +1,19 @@
 #include "wdmonitorthread_linux.h"
 
 #include <algorithm>
+#include <array>
 #include <atomic>
 #include <climits>
-#include <cstdio>
 #include <cstdlib>
+#include <optional>
+#include <string_view>
 #include <utility>
 
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include "ProcessStatistics_Linux.h"
+#include "wdinputfile.h"
 #include "wdlogbuffer.h"
 #include "wdsettings.h"
 #include "xmlparser.h"
@@ -27,6 +30,9 @@ constexpr unsigned kFirstRetryPauseSeconds = 30;
 constexpr unsigned kGeneralRetryPauseSeconds = 60;
 constexpr unsigned kFunctionalRetryPauseSeconds = 60;
 constexpr unsigned kFunctionalRecoveryPauseSeconds = 1;
+
+// A first line is mostly much shorter.
+constexpr std::size_t kReadBlockBytes = 256;
 
 // Beyond the ratings: no functional ping has been made yet in this phase.
 constexpr int kNoFunctionalPingYet = -2;
@@ -103,13 +109,20 @@ void runforeffect(const std::string& command)
     [[maybe_unused]] const int ignored = std::system(command.c_str());
 }
 
-// Up to the first newline; nothing where the file is null.
-std::string readfirstline(std::FILE* file)
+// What the file holds up to its first newline, or nothing where it cannot be opened.
+std::optional<std::string> readfirstline(const std::string& path)
 {
+    wdinputfile file(path);
+    if (!file.isopen()) {
+        return std::nullopt;
+    }
     std::string line;
-    if (file != nullptr) {
-        for (int c = std::getc(file); c != EOF && c != '\n'; c = std::getc(file)) {
-            line += static_cast<char>(c);
+    std::array<char, kReadBlockBytes> block; // read() fills what is taken from it
+    for (auto piece = file.read(block); !piece.empty(); piece = file.read(block)) {
+        const std::size_t newline = piece.find('\n');
+        line.append(piece.substr(0, newline));
+        if (newline != std::string_view::npos) {
+            break;
         }
     }
     return line;
@@ -265,15 +278,15 @@ int wdmonitorthread::generalping(const service& svc)
         return kGeneralPingRefused;
     }
     wdlog(kModule, kLevelDebug, "enter of general ping, after get read lock.");
-    const std::string statusfile = _tmp_file_path + "agent." + svc.name;
+    const std::string statusfile = _tmp_file_path + "agent." + svc.name.str();
     const std::string command =
-        "service " + svc.name + " status 1>" + statusfile + " 2>" + statusfile;
+        "service " + svc.name.str() + " status 1>" + statusfile + " 2>" + statusfile;
     const int state = runforstate(command);
-    const auto file = Utility::OpenToRead(statusfile);
-    if (!file) {
+    const auto found = readfirstline(statusfile);
+    if (!found) {
         wdlog(kModule, kLevelDebug, "Unable to open service status file.");
     }
-    const std::string line = readfirstline(file.get());
+    const std::string line = found.value_or("");
     wdlog(kModule, kLevelDebug, "command = ", command, ", result = ", line, ", state = ", state);
     return ratestatus(line, state);
 }
@@ -306,17 +319,17 @@ int wdmonitorthread::functionalping()
     }
     const service& svc = montarget.monitoredservice;
     wdlog(kModule, kLevelDebug, "Performing functional ping, process id is: ", getpid(),
-          ", fp cmd is: ", svc.functionalpingcmd);
+          ", fp cmd is: ", svc.functionalpingcmd.str());
     if (svc.functionalpingcmd == kNoCommand) {
         return kFunctionalPingRefused;
     }
-    const std::string outputfile = _tmp_file_path + "agent.functionalping." + svc.name;
-    runforeffect(svc.functionalpingcmd + " 1>" + outputfile + " 2>" + outputfile);
-    const auto file = Utility::OpenToRead(outputfile);
-    if (!file) {
+    const std::string outputfile = _tmp_file_path + "agent.functionalping." + svc.name.str();
+    runforeffect(svc.functionalpingcmd.str() + " 1>" + outputfile + " 2>" + outputfile);
+    const auto found = readfirstline(outputfile);
+    if (!found) {
         wdlog(kModule, kLevelDebug, " unable to open service status file.");
     }
-    const std::string answer = readfirstline(file.get());
+    const std::string answer = found.value_or("");
     const functionalpingresult result = rateanswer(answer);
     lograting(result, answer);
     return result;
@@ -526,7 +539,7 @@ void wdmonitorthread::stopmonitored() const
     if (command != kNoCommand) {
         wdlog(kModule, kLevelDebug, "User provided stop command: ", command);
     } else {
-        command = "service " + svc.name + " stop";
+        command = "service " + svc.name.str() + " stop";
         wdlog(kModule, kLevelDebug, "Service stop command:", command);
     }
     if (isconfigured(svc)) {
@@ -546,7 +559,7 @@ void wdmonitorthread::stopdependents()
             wdlog(kModule, kLevelDebug, "User provided stop command dep: ", command,
                   dependent.name);
         } else {
-            command = "service " + dependent.name + " stop";
+            command = "service " + dependent.name.str() + " stop";
             wdlog(kModule, kLevelDebug, "Service stop command dep:", command);
         }
         if (generalping(dependent) != kServiceNotRunning && isconfigured(dependent)) {
@@ -569,7 +582,7 @@ void wdmonitorthread::startmonitored()
     if (command != kNoCommand) {
         wdlog(kModule, kLevelDebug, "User provided command start:", command);
     } else {
-        command = "service " + svc.name + " start";
+        command = "service " + svc.name.str() + " start";
         wdlog(kModule, kLevelDebug, "Service command start:", command);
     }
     if (isconfigured(svc)) {
@@ -587,7 +600,7 @@ void wdmonitorthread::startdependents()
         if (command != kNoCommand) {
             wdlog(kModule, kLevelDebug, "User provided command start dep:", command);
         } else {
-            command = "service " + dependent.name + " start";
+            command = "service " + dependent.name.str() + " start";
             wdlog(kModule, kLevelDebug, "Service command start dep:", command);
         }
         if (generalping(dependent) != kServiceRunning && isconfigured(dependent)) {

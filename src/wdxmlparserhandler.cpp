@@ -21,7 +21,7 @@ constexpr const char* kLimitsModule = "wdxmlparserhandler";
 
 struct fieldelement {
     const char* name;
-    std::string service::*field;
+    wdtext service::*field;
 };
 
 constexpr std::array<fieldelement, 16> kFieldElements{{
@@ -44,7 +44,7 @@ constexpr std::array<fieldelement, 16> kFieldElements{{
 }};
 
 // The field that an element of this name fills, or null.
-std::string service::*fieldnamed(const std::string& element)
+wdtext service::*fieldnamed(const std::string& element)
 {
     for (const auto& known : kFieldElements) {
         if (element == known.name) {
@@ -56,10 +56,10 @@ std::string service::*fieldnamed(const std::string& element)
 
 // A field element has ended and left the stack. Only what directly encloses it decides whose field
 // it is; anywhere but in wdmonitorservice it is the dependent service's.
-void storefield(std::string service::*field)
+void storefield(wdtext service::*field)
 {
     const bool monitored = !xercecstack.empty() && xercecstack.top() == "wdmonitorservice";
-    (monitored ? monitorservice : monservicedep).*field = charparse;
+    (monitored ? monitorservice : monservicedep).*field = std::string_view(charparse);
 }
 
 void storetarget()

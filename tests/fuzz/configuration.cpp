@@ -23,7 +23,7 @@ constexpr char kSeparator = '\x1e';
 
 struct Field {
     const char* element;
-    std::string service::*value;
+    wdtext service::*value;
 };
 
 constexpr std::array<Field, 16> kFields{{

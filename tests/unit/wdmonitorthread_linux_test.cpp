@@ -1024,6 +1024,11 @@ TEST_F(GeneralPing, OnlyTheFirstLineCounts)
     EXPECT_EQ(rate("running\nstopped\n", 1), 0);
 }
 
+TEST_F(GeneralPing, LongFirstLineCountsToItsEnd)
+{
+    EXPECT_EQ(rate(std::string(1000, '.') + " running\nstopped\n", 1), 0);
+}
+
 TEST_F(GeneralPing, ExitStatusDecidesWhereNoWordDoes)
 {
     EXPECT_EQ(rate("active", 0), 0);
