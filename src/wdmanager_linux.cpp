@@ -88,6 +88,7 @@ void wdmanager::startgeneration()
 {
     enablemonitoring(true);
     threads.clear();
+    threads.reserve(targets.size());
     for (const wdmonitortarget& watched : targets) {
         threads.emplace_back(watched);
     }

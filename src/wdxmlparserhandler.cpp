@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <array>
+#include <string_view>
+#include <unordered_set>
 
 #include "wdlogbuffer.h"
 #include "xmlparser.h"
@@ -13,6 +15,8 @@ service monservicedep;
 std::vector<service> monservicedepends;
 wdmonitortarget target;
 
+using namespace std::string_view_literals;
+
 namespace {
 
 // The two module names of the listing. Log filters in use know both, the trailing blank included.
@@ -20,7 +24,7 @@ constexpr const char* kListingModule = "wdxmlparserhandler ";
 constexpr const char* kLimitsModule = "wdxmlparserhandler";
 
 struct fieldelement {
-    const char* name;
+    std::string_view name;
     wdtext service::*field;
 };
 
@@ -43,10 +47,14 @@ constexpr std::array<fieldelement, 16> kFieldElements{{
     {"ThresholdHandleCount", &service::ThresholdHandleCount},
 }};
 
-// The field that an element of this name fills, or null.
-wdtext service::*fieldnamed(const std::string& element)
+// The field that an element of this name fills, or null. Most files give the fields in this order:
+// the search begins behind the field found before.
+wdtext service::*fieldnamed(std::string_view element)
 {
-    for (const auto& known : kFieldElements) {
+    static std::size_t next = 0;
+    for (std::size_t i = 0; i < kFieldElements.size(); ++i) {
+        const auto& known = kFieldElements.at(next);
+        next = (next + 1) % kFieldElements.size();
         if (element == known.name) {
             return known.field;
         }
@@ -58,7 +66,7 @@ wdtext service::*fieldnamed(const std::string& element)
 // it is; anywhere but in wdmonitorservice it is the dependent service's.
 void storefield(wdtext service::*field)
 {
-    const bool monitored = !xercecstack.empty() && xercecstack.top() == "wdmonitorservice";
+    const bool monitored = !xercecstack.empty() && xercecstack.top() == "wdmonitorservice"sv;
     (monitored ? monitorservice : monservicedep).*field = std::string_view(charparse);
 }
 
@@ -121,7 +129,7 @@ void listdependent(const service& svc)
 void startElement(const std::string& name)
 {
     xercecstack.push(name);
-    if (name == "wdmonitortarget") {
+    if (name == "wdmonitortarget"sv) {
         monservicedepends.clear();
     }
 }
@@ -136,29 +144,37 @@ void endElement(const std::string& /*name*/)
     if (xercecstack.empty()) {
         return;
     }
-    const std::string closing = xercecstack.top();
+    const std::string& closing = xercecstack.top(); // until it is popped
     if (const auto field = fieldnamed(closing); field != nullptr) {
         xercecstack.pop();
         storefield(field);
-    } else if (closing == "wdmonitorservice" || closing == "wdtargets") {
+    } else if (closing == "wdmonitorservice"sv || closing == "wdtargets"sv) {
         xercecstack.pop();
-    } else if (closing == "wdmondependsev") {
+    } else if (closing == "wdmondependsev"sv) {
         xercecstack.pop();
         monservicedepends.push_back(monservicedep);
-    } else if (closing == "wdmonitortarget") {
+    } else if (closing == "wdmonitortarget"sv) {
         xercecstack.pop();
         storetarget();
     }
 }
 
+// Adds as addservice does, but with an index of the names: searching the list for every service of
+// a file takes a time that grows with their square.
 void endDocument()
 {
     xmlparser::allservices.clear();
+    std::unordered_set<std::string_view> names;
+    const auto add = [&names](const service& candidate) {
+        if (names.insert(candidate.name.str()).second) {
+            xmlparser::allservices.push_back(candidate);
+        }
+    };
     for (const auto& finished : xmlparser::alltargets) {
-        addservice(finished.monitoredservice, xmlparser::allservices);
+        add(finished.monitoredservice);
         listmonitored(finished.monitoredservice);
         for (const auto& dependent : finished.dependentservices) {
-            addservice(dependent, xmlparser::allservices);
+            add(dependent);
             listdependent(dependent);
         }
     }

@@ -1,14 +1,15 @@
 #include "xmlparser.h"
 
-#include <array>
-#include <cstdio>
+#include <algorithm>
+#include <memory>
 #include <stdexcept>
 #include <string_view>
+#include <utility>
 
 #include <unistd.h>
 
-#include "ProcessStatistics_Linux.h"
 #include "wdLocalLog_linux.h"
+#include "wdinputfile.h"
 #include "wdxmlparserhandler.h"
 
 const char control[20] = {'\n', '\r', '\t', ' '};
@@ -19,34 +20,48 @@ std::vector<wdmonitortarget> xmlparser::alltargets;
 namespace {
 
 constexpr std::size_t npos = std::string_view::npos;
-constexpr std::size_t kReadBlockBytes = 65536;
+constexpr std::size_t kLeastRoomBytes = 4096;
 
-std::string readfile(const std::string& path)
-{
-    std::string text;
-    const auto file = Utility::OpenToRead(path);
-    if (!file) {
-        // The 0 stands where a reason would; scripts that watch standard error match it.
-        writestandard(STDERR_FILENO, "error, unable to open the input file: 0\n");
-        return text;
+// The bytes of a whole file. Not a string, which would be filled twice.
+class filetext {
+public:
+    explicit filetext(const std::string& path)
+    {
+        wdinputfile file(path);
+        if (!file.isopen()) {
+            // The 0 stands where a reason would; scripts that watch standard error match it.
+            writestandard(STDERR_FILENO, "error, unable to open the input file: 0\n");
+            return;
+        }
+        grow(file.size() + 1); // one more, so that the end shows without growing
+        for (std::size_t got = 1; got > 0; used += got) {
+            if (used == room) {
+                grow(2 * room);
+            }
+            got = file.read({bytes.get() + used, room - used}).size();
+        }
     }
-    std::array<char, kReadBlockBytes> block{};
-    for (std::size_t got = 0; (got = std::fread(block.data(), 1, block.size(), file.get())) > 0;) {
-        text.append(block.data(), got);
-    }
-    return text;
-}
 
-// Without white space at both ends. A token of nothing else is an error that ends the reading.
-std::string trimmed(std::string_view token)
-{
-    const std::size_t first = token.find_first_not_of(control, 0, kControlCount);
-    if (first == npos) {
-        throw std::out_of_range("basic_string::substr");
+    [[nodiscard]] std::string_view text() const { return {bytes.get(), used}; }
+
+private:
+    void grow(std::size_t wanted)
+    {
+        room = std::max(wanted, kLeastRoomBytes);
+        auto larger = std::make_unique_for_overwrite<char[]>(room);
+        std::copy_n(bytes.get(), used, larger.get());
+        bytes = std::move(larger);
     }
-    const std::size_t last = token.find_last_not_of(control, npos, kControlCount);
-    return std::string(token.substr(first, last - first + 1));
-}
+
+    std::unique_ptr<char[]> bytes;
+    std::size_t room = 0;
+    std::size_t used = 0;
+};
+
+// An object, not a function, so that it is inlined where it is handed over.
+constexpr auto blank = [](char c) {
+    return c == control[0] || c == control[1] || c == control[2] || c == control[3];
+};
 
 // The scan of one text. `cur` is where the next token begins; `pos` is where the search for it
 // does. They differ behind an end tag, where `pos` stays on the ">": the next pass finds that ">"
@@ -64,9 +79,11 @@ public:
     {
         while (cur != last && cur != npos) {
             skipdeclaration();
-            pos = text.find_first_not_of(control, pos, kControlCount);
+            while (pos < text.size() && blank(text[pos])) {
+                ++pos;
+            }
             cur = pos;
-            if (cur == npos) {
+            if (cur >= text.size()) {
                 return;
             }
             if (text[cur] == '<') {
@@ -93,51 +110,74 @@ private:
     // lead back over text already read, without end; there the "<?" is read as any other tag.
     void skipdeclaration()
     {
-        if (text.substr(cur, 2) == "<?" && behinddeclaration >= cur) {
+        const bool mark = cur + 1 < text.size() && text[cur] == '<' && text[cur + 1] == '?';
+        if (mark && behinddeclaration >= cur) {
             pos = behinddeclaration;
         }
+    }
+
+    // Without white space at both ends. A token of nothing else is an error that ends the reading.
+    static std::string_view trimmed(std::string_view untrimmed)
+    {
+        while (!untrimmed.empty() && blank(untrimmed.front())) {
+            untrimmed.remove_prefix(1);
+        }
+        if (untrimmed.empty()) {
+            throw std::out_of_range("basic_string::substr");
+        }
+        while (blank(untrimmed.back())) {
+            untrimmed.remove_suffix(1);
+        }
+        return untrimmed;
+    }
+
+    // `token` as a string, in `kept`, where it may be already from the token before.
+    static const std::string& keep(std::string& kept, std::string_view token)
+    {
+        if (kept != token) {
+            kept.assign(token);
+        }
+        return kept;
     }
 
     void readtext()
     {
         pos = text.find('<', pos + 1);
-        characters(trimmed(text.substr(cur, pos == npos ? npos : pos - cur)));
+        std::string& kept = text[cur] == '>' ? bracket : value;
+        characters(keep(kept, trimmed(text.substr(cur, pos == npos ? npos : pos - cur))));
         cur = pos;
     }
 
     // A "/" anywhere before the ">" makes an end tag of it, attributes or not.
     void readtag()
     {
-        pos = text.find_first_of(">/", pos);
-        if (pos == npos) {
-            cur = npos;
-        } else if (text[pos] == '>') {
-            readstarttag();
-        } else {
-            readendtag();
-        }
-    }
-
-    void readstarttag()
-    {
-        startElement(trimmed(text.substr(cur + 1, pos - cur - 1)));
-        ++pos;
-        cur = pos;
-    }
-
-    void readendtag()
-    {
-        const std::size_t slash = pos;
-        pos = text.find('>', slash);
+        pos = text.find('>', pos);
         if (pos == npos) {
             cur = npos;
             return;
         }
-        const std::string_view name = text.substr(slash + 1, pos - slash - 1);
-        endElement(trimmed(name));
+        const std::string_view inside = text.substr(cur + 1, pos - cur - 1);
+        const std::size_t slash = inside.starts_with('/') ? 0 : inside.find('/');
+        if (slash != npos) {
+            readendtag(inside.substr(slash + 1));
+        } else {
+            readstarttag(inside);
+        }
+    }
+
+    void readstarttag(std::string_view inside)
+    {
+        startElement(keep(name, trimmed(inside)));
+        ++pos;
+        cur = pos;
+    }
+
+    void readendtag(std::string_view untrimmed)
+    {
+        endElement(keep(name, trimmed(untrimmed)));
         // Only the root's closing tag leaves `cur` on its ">", which ends the reading there if it
         // is the last one of the file. The name is compared untrimmed.
-        cur = name == "wdtargets" ? pos : pos + 1;
+        cur = untrimmed == "wdtargets" ? pos : pos + 1;
     }
 
     std::string_view text;
@@ -145,6 +185,12 @@ private:
     std::size_t cur;
     std::size_t last;
     std::size_t behinddeclaration;
+
+    // The last tokens of each kind. Most end tags have the name of the tag before, and most texts
+    // behind an end tag are its ">".
+    std::string name;
+    std::string value;
+    std::string bracket;
 };
 
 } // namespace
@@ -153,8 +199,8 @@ int xmlparser::parse(std::string path)
 {
     allservices.clear();
     alltargets.clear();
-    const std::string text = readfile(path);
-    scan(text).run();
+    const filetext file(path);
+    scan(file.text()).run();
     endDocument();
     return 0;
 }

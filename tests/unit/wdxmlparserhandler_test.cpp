@@ -142,6 +142,33 @@ TEST_F(Handler, DocumentWithADependentFillsEveryFieldOfBoth)
     expectfull(xmlparser::allservices[1], "datastore", "-d");
 }
 
+TEST_F(Handler, FieldsMayComeInAnyOrder)
+{
+    for (const auto* name : {"ThresholdHandleCount", "name", "name", "stopcmd", "startcmd"}) {
+        field(name, name);
+    }
+    EXPECT_EQ(monservicedep.ThresholdHandleCount, "ThresholdHandleCount");
+    EXPECT_EQ(monservicedep.name, "name");
+    EXPECT_EQ(monservicedep.stopcmd, "stopcmd");
+    EXPECT_EQ(monservicedep.startcmd, "startcmd");
+    EXPECT_TRUE(xercecstack.empty());
+}
+
+TEST_F(Handler, ServicesAreListedOnceInOrderOfAppearance)
+{
+    std::string targets;
+    Names expected;
+    for (int i = 0; i < 500; ++i) {
+        const std::string name = "service" + std::to_string(i);
+        const std::string known = "service" + std::to_string(i / 2);
+        targets += targetof(fullservice("wdmonitorservice", name, "") +
+                            fullservice("wdmondependsev", known, ""));
+        expected.push_back(name);
+    }
+    load(document(targets));
+    EXPECT_EQ(names(xmlparser::allservices), expected);
+}
+
 TEST_F(Handler, SampleConfigurationSaysEverythingOfBothItsServices)
 {
     const std::string sample = SAMPLE_CONFIGURATION;

@@ -3,8 +3,12 @@
 
 #include "xmlparser.h"
 
+#include <fstream>
 #include <stdexcept>
+#include <thread>
 #include <vector>
+
+#include <sys/stat.h>
 
 #include <gtest/gtest.h>
 
@@ -316,6 +320,18 @@ TEST_F(Reader, ManyLateDeclarationsAreReadInOneGo)
         text += "<?>";
     }
     EXPECT_EQ(read(text).size(), kTags + 2);
+}
+
+// The size of a pipe is not known beforehand.
+TEST_F(Reader, LongPipeIsReadWhole)
+{
+    const std::string name = folder.path("pipe");
+    ASSERT_EQ(mkfifo(name.c_str(), 0600), 0);
+    const std::string longtext(200000, 't');
+    std::thread writer([&] { std::ofstream(name) << "<a>" << longtext << "</a>"; });
+    xmlparser::parse(name);
+    writer.join();
+    EXPECT_EQ(tokens[1], longtext);
 }
 
 TEST_F(Reader, FileLongerThanOneReadIsWhole)
