@@ -49,7 +49,7 @@ struct Plan {
     std::size_t moments;          // at which recoveries come, within such an interval
     int calibrating;              // checks that tell how long one lasts
     std::vector<double> inflight; // of part two: mean number of checks in flight
-    std::vector<double> trying;   // seconds for each of these; a try that has begun goes on
+    std::vector<double> trying;   // seconds for each; what a last try takes longer, the next loses
     std::size_t most;             // tries for each
     Seconds bound;                // of one try
 };
@@ -59,7 +59,7 @@ const Plan kWholePlan{.targets = {10, 100, 1000},
                       .moments = 120,
                       .calibrating = 20,
                       .inflight = {0.05, 0.1, 0.25, 0.5, 1, 2, 3, 4, 5, 6, 8},
-                      .trying = {5, 5, 5, 5, 5, 7, 14, 20, 22, 24, 16},
+                      .trying = {5, 5, 5, 5, 5, 7, 14, 18, 22, 26, 30},
                       .most = 1000,
                       .bound = Seconds(15)};
 const Plan kBriefPlan{.targets = {10},
@@ -386,16 +386,15 @@ struct Tries {
     }
 };
 
-// Tries until the time is up. Between two tries lies a pause of 1 to 2 checks: by then whatever the
-// recovery has kept waiting is over, and its end does not tell when the next moment without checks
-// will be.
-Tries tryrecoveries(Failing& failing, const Plan& plan, double trying, double meanpause,
-                    double lasting)
+// Tries until the time is up, at least once. Between two tries lies a pause of 1 to 2 checks: by
+// then whatever the recovery has kept waiting is over, and its end does not tell when the next
+// moment without checks will be.
+Tries tryrecoveries(Failing& failing, const Plan& plan, Clock::time_point deadline,
+                    double meanpause, double lasting)
 {
     Tries tries;
     auto checkers = std::make_unique<Checkers>(meanpause);
-    const auto deadline = Clock::now() + seconds(trying);
-    while (tries.all < plan.most && Clock::now() < deadline) {
+    do {
         std::this_thread::sleep_for(seconds(between(lasting, 2 * lasting)));
         auto recovery = std::async(std::launch::async, [&] { return failing.recover(); });
         ++tries.all;
@@ -407,7 +406,7 @@ Tries tryrecoveries(Failing& failing, const Plan& plan, double trying, double me
             const WriteRequest request = recovery.get();
             tries.waits.push_back(count(request.held - request.entered));
         }
-    }
+    } while (tries.all < plan.most && Clock::now() < deadline);
     std::sort(tries.waits.begin(), tries.waits.end());
     return tries;
 }
@@ -422,8 +421,10 @@ public:
 
     json table()
     {
+        auto deadline = Clock::now();
         for (std::size_t i = 0; i < plan.inflight.size(); ++i) {
-            measure(plan.inflight[i], plan.trying[i]);
+            deadline += seconds(plan.trying[i]);
+            measure(plan.inflight[i], deadline);
         }
         return {{"id", "lockwait-starving"},
                 {"title", "How long a recovery waits for its turn, by the checks in flight"},
@@ -454,12 +455,12 @@ private:
     // Waits below that are those for an idle lock, and no part of a logarithmic curve.
     static constexpr double kLeastDrawn = 0.001;
 
-    void measure(double inflight, double trying)
+    void measure(double inflight, Clock::time_point deadline)
     {
         // Each of N checkers is in flight for a part lasting / (lasting + pause) of its time.
         const double meanpause = kCheckers * lasting / inflight - lasting;
         takereads();
-        const Tries tries = tryrecoveries(failing, plan, trying, meanpause, lasting);
+        const Tries tries = tryrecoveries(failing, plan, deadline, meanpause, lasting);
         const Reads checks = takereads();
         const double length = checks.count > 0 ? averagelength(checks) : lasting;
         addrow(kCheckers * length / (meanpause + length), length, checks.count, tries);
