@@ -500,10 +500,13 @@ private:
                " s. Waits are in lengths of a check. Reckoned: checks of one length that begin "
                "independently of each other; the mean is then (e^r - 1)/r - 1 for r in flight. "
                "To know r for a configuration, add up over all pings and checks how long one "
-               "lasts, divided by its interval: 100 checks of 0.6 s every 60 s are 1. Keep r below "
-               "1, where a recovery waits for less than one check on average; each further 1 "
-               "makes it wait two to three times as long, and from 6 on it waits for minutes as "
-               "soon as a check lasts a second.";
+               "lasts, "
+               "divided by the time from one to the next, which is the sum of both intervals where "
+               "a service has a check: 100 checks of 1.2 s, 60 s and 60 s, are 1. Keep r below 1, "
+               "where a recovery waits for less than one check on average; each further 1 makes it "
+               "wait two to three times as long, and at 6 it waits for more than a minute if a "
+               "check "
+               "lasts a second.";
     }
 
     Failing& failing;
