@@ -311,12 +311,12 @@ json measureusual(Failing& failing, const Plan& plan)
         {"rows", rows},
         {"note",
          "The daemon's own monitors, begun at once, with a `service` command of one line, and "
-         "recoveries at random moments of the second round of pings: from entering to holding "
-         "the write side. The interval is " +
-             std::to_string(plan.interval) +
-             " s where 60 s are usual: the load is six times as dense as usual, and a wait six "
-             "times as likely, but not longer. Moments that pass while an earlier recovery "
-             "waits count with the rest of its wait."}};
+         "recoveries at random moments of the interval around the second round of pings: from "
+         "entering to holding the write side. The interval is " +
+             std::to_string(plan.interval) + " s where 60 s are usual: a recovery meets a round " +
+             std::to_string(60 / plan.interval) +
+             " times as often as usual, but waits no longer then. Moments that pass while an "
+             "earlier recovery waits count with the rest of its wait."}};
 }
 
 // Monitors that make their check at random moments, each with a thread of its own.
