@@ -20,47 +20,126 @@ std::vector<wdmonitortarget> xmlparser::alltargets;
 namespace {
 
 constexpr std::size_t npos = std::string_view::npos;
-constexpr std::size_t kLeastRoomBytes = 4096;
+constexpr std::size_t kWindowBytes = 65536;
+constexpr std::size_t kBehindMark = 2; // a declaration's own "?" is not the one that ends it
 
-// The bytes of a whole file. Not a string, which would be filled twice.
+bool blank(int c)
+{
+    return c == control[0] || c == control[1] || c == control[2] || c == control[3];
+}
+
+// The text of a file, read as the scan gets on. Places are counted from the text's start, but only
+// what the scan has not yet finished with is held: a window that grows to the longest token.
 class filetext {
 public:
-    explicit filetext(const std::string& path)
+    static constexpr int kEnd = -1;
+
+    explicit filetext(const std::string& path) : file(path)
     {
-        wdinputfile file(path);
         if (!file.isopen()) {
             // The 0 stands where a reason would; scripts that watch standard error match it.
             writestandard(STDERR_FILENO, "error, unable to open the input file: 0\n");
-            return;
-        }
-        grow(file.size() + 1); // one more, so that the end shows without growing
-        for (std::size_t got = 1; got > 0; used += got) {
-            if (used == room) {
-                grow(2 * room);
-            }
-            got = file.read({bytes.get() + used, room - used}).size();
         }
     }
 
-    [[nodiscard]] std::string_view text() const { return {bytes.get(), used}; }
+    // The place of the first `c` at or after `from`, or npos.
+    std::size_t find(char c, std::size_t from)
+    {
+        const std::size_t found = from < limit ? held().find(c, from - start) : npos;
+        return found != npos ? start + found : findinrest(c, std::max(from, limit));
+    }
+
+    // The character at `place`, or kEnd.
+    int at(std::size_t place)
+    {
+        const bool there = place < limit || readto(place);
+        return there ? static_cast<unsigned char>(window[place - start]) : kEnd;
+    }
+
+    // From a place up to another, or to the text's end for npos; all of it has to have been found,
+    // and not to be finished with. Valid until more is looked for.
+    [[nodiscard]] std::string_view from(std::size_t place, std::size_t to) const
+    {
+        return {window.get() + (place - start), (to == npos ? limit : to) - place};
+    }
+
+    // Nothing before `place` will be asked for any more.
+    void finishedto(std::size_t place) { needed = place; }
+
+    // The place of the text's first "?" from its third character on, or npos; `within` is a place
+    // that has been reached, and the "?" is looked for beyond it only where it is the text's start.
+    std::size_t firstmark(std::size_t within)
+    {
+        return mark == npos && within == 0 ? find('?', kBehindMark) : mark;
+    }
 
 private:
-    void grow(std::size_t wanted)
+    [[nodiscard]] std::string_view held() const { return {window.get(), limit - start}; }
+
+    std::size_t findinrest(char c, std::size_t from)
     {
-        room = std::max(wanted, kLeastRoomBytes);
-        auto larger = std::make_unique_for_overwrite<char[]>(room);
-        std::copy_n(bytes.get(), used, larger.get());
-        bytes = std::move(larger);
+        std::size_t found = npos;
+        while (found == npos && readto(from)) {
+            found = held().find(c, from - start);
+            from = limit;
+        }
+        return found != npos ? start + found : npos;
     }
 
-    std::unique_ptr<char[]> bytes;
-    std::size_t room = 0;
-    std::size_t used = 0;
-};
+    bool readto(std::size_t place)
+    {
+        while (place >= limit) {
+            if (!readon()) {
+                return false;
+            }
+        }
+        return true;
+    }
 
-// An object, not a function, so that it is inlined where it is handed over.
-constexpr auto blank = [](char c) {
-    return c == control[0] || c == control[1] || c == control[2] || c == control[3];
+    // False at the end of the file, which is not asked again: a terminal would give more.
+    bool readon()
+    {
+        if (ended) {
+            return false;
+        }
+        if (limit - start == room) {
+            makeroom();
+        }
+        const std::size_t used = limit - start;
+        const auto piece = file.read({window.get() + used, room - used});
+        if (mark == npos) {
+            const std::size_t skipped = limit < kBehindMark ? kBehindMark - limit : 0;
+            const std::size_t found = piece.find('?', skipped);
+            mark = found == npos ? npos : limit + found;
+        }
+        limit += piece.size();
+        ended = piece.empty();
+        return !ended;
+    }
+
+    // Drops what is finished with; grows where that is less than half.
+    void makeroom()
+    {
+        const std::string_view rest = held().substr(std::min(needed, limit) - start);
+        if (rest.size() > room / 2) {
+            room *= 2;
+            auto larger = std::make_unique_for_overwrite<char[]>(room);
+            std::copy(rest.begin(), rest.end(), larger.get());
+            window = std::move(larger);
+        } else {
+            std::copy(rest.begin(), rest.end(), window.get());
+        }
+        start = limit - rest.size();
+    }
+
+    wdinputfile file;
+    std::size_t room = kWindowBytes;
+    std::unique_ptr<char[]> window = std::make_unique_for_overwrite<char[]>(room);
+    std::size_t start = 0;  // of the window
+    std::size_t limit = 0;  // the first place that is not yet read
+    std::size_t needed = 0; // the first place that is not finished with
+    std::size_t mark = npos;
+    bool ended = false;
 };
 
 // The scan of one text. `cur` is where the next token begins; `pos` is where the search for it
@@ -68,51 +147,47 @@ constexpr auto blank = [](char c) {
 // as a piece of text and delivers it. Empty elements get their value from this.
 class scan {
 public:
-    explicit scan(std::string_view whole)
-        : text(whole), pos(whole.find('<')), cur(pos), last(whole.rfind('>')),
-          behinddeclaration(placebehinddeclaration(whole))
-    {
-    }
+    explicit scan(const std::string& path) : text(path), pos(text.find('<', 0)), cur(pos) {}
 
     // Tokens to the end: either the last ">" of the text or, outside the dialect, the text's end.
     void run()
     {
-        while (cur != last && cur != npos) {
-            skipdeclaration();
-            while (pos < text.size() && blank(text[pos])) {
+        while (cur != npos) {
+            text.finishedto(pos);
+            int character = text.at(cur);
+            if (character == '>' && text.find('>', cur + 1) == npos) {
+                return;
+            }
+            if (character == '<' && text.at(cur + 1) == '?') {
+                skipdeclaration();
+            }
+            for (character = text.at(pos); blank(character); character = text.at(pos)) {
                 ++pos;
             }
             cur = pos;
-            if (cur >= text.size()) {
-                return;
-            }
-            if (text[cur] == '<') {
+            if (character == '<') {
                 readtag();
-            } else {
+            } else if (character != filetext::kEnd) {
                 readtext();
+            } else {
+                return;
             }
         }
     }
 
 private:
-    // Where the text goes on behind a declaration at its first byte; without the "?" that ends one,
-    // at the declaration's first "?".
-    static std::size_t placebehinddeclaration(std::string_view whole)
-    {
-        constexpr std::size_t kInsideDeclaration = 2;
-        constexpr std::size_t kDeclarationEndBytes = 2;
-        constexpr std::size_t kWithoutMark = 1;
-        const std::size_t mark = whole.find('?', kInsideDeclaration);
-        return mark == npos ? kWithoutMark : mark + kDeclarationEndBytes;
-    }
-
-    // There is one place behind a declaration, wherever the "<?" stands. From a later one it would
-    // lead back over text already read, without end; there the "<?" is read as any other tag.
+    // There is one place behind a declaration, wherever the "<?" stands: behind the text's first
+    // "?" that can end one and the character after it, or, without such a "?", on the second
+    // character. From a later "<?" it would lead back over text already read, without end; there
+    // the "<?" is read as any other tag.
     void skipdeclaration()
     {
-        const bool mark = cur + 1 < text.size() && text[cur] == '<' && text[cur + 1] == '?';
-        if (mark && behinddeclaration >= cur) {
-            pos = behinddeclaration;
+        constexpr std::size_t kMarkAndBracket = 2;
+        constexpr std::size_t kSecondCharacter = 1;
+        const std::size_t mark = text.firstmark(cur);
+        const std::size_t behind = mark == npos ? kSecondCharacter : mark + kMarkAndBracket;
+        if (behind >= cur) {
+            pos = behind;
         }
     }
 
@@ -142,9 +217,10 @@ private:
 
     void readtext()
     {
+        static const std::string bracket = ">"; // what most texts behind an end tag are
         pos = text.find('<', pos + 1);
-        std::string& kept = text[cur] == '>' ? bracket : value;
-        characters(keep(kept, trimmed(text.substr(cur, pos == npos ? npos : pos - cur))));
+        const std::string_view token = trimmed(text.from(cur, pos));
+        characters(token.size() == 1 && token.front() == '>' ? bracket : keep(value, token));
         cur = pos;
     }
 
@@ -156,7 +232,7 @@ private:
             cur = npos;
             return;
         }
-        const std::string_view inside = text.substr(cur + 1, pos - cur - 1);
+        const std::string_view inside = text.from(cur + 1, pos);
         const std::size_t slash = inside.starts_with('/') ? 0 : inside.find('/');
         if (slash != npos) {
             readendtag(inside.substr(slash + 1));
@@ -180,17 +256,13 @@ private:
         cur = untrimmed == "wdtargets" ? pos : pos + 1;
     }
 
-    std::string_view text;
+    filetext text;
     std::size_t pos;
     std::size_t cur;
-    std::size_t last;
-    std::size_t behinddeclaration;
 
-    // The last tokens of each kind. Most end tags have the name of the tag before, and most texts
-    // behind an end tag are its ">".
+    // The last tokens of each kind. Most end tags have the name of the tag before.
     std::string name;
     std::string value;
-    std::string bracket;
 };
 
 } // namespace
@@ -199,8 +271,7 @@ int xmlparser::parse(std::string path)
 {
     allservices.clear();
     alltargets.clear();
-    const filetext file(path);
-    scan(file.text()).run();
+    scan(path).run();
     endDocument();
     return 0;
 }

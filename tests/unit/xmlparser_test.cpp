@@ -322,7 +322,27 @@ TEST_F(Reader, ManyLateDeclarationsAreReadInOneGo)
     EXPECT_EQ(read(text).size(), kTags + 2);
 }
 
-// The size of a pipe is not known beforehand.
+// The text is held in pieces of this size.
+TEST_F(Reader, TokensMayLieAcrossAnyEdge)
+{
+    constexpr std::size_t kWindow = 65536;
+    const std::string rest = "</a>\n<bb> c </bb></wdtargets>\n";
+    for (std::size_t before = 0; before <= rest.size(); ++before) {
+        const std::string filling(kWindow - 3 - before, 't');
+        tokens.clear();
+        EXPECT_EQ(read("<a>" + filling + rest), (Tokens{"<a>", filling, "</a>", ">", "<bb>", "c",
+                                                        "</bb>", ">", "</wdtargets>", "END"}))
+            << before;
+    }
+}
+
+TEST_F(Reader, LateDeclarationIsRememberedAcrossTheEdge)
+{
+    const std::string filling(200000, 't');
+    EXPECT_EQ(read("<a?>" + filling + "<?b></wdtargets>"),
+              (Tokens{"<a?>", filling, "<?b>", "</wdtargets>", "END"}));
+}
+
 TEST_F(Reader, LongPipeIsReadWhole)
 {
     const std::string name = folder.path("pipe");
