@@ -7,7 +7,7 @@ import programs as setup
 from results import say
 
 USUAL_SECONDS = 30  # what monit's own example sets
-QUIET_SECONDS = 0.5
+QUIET_SECONDS = 0.2
 
 
 class Idle:
@@ -64,8 +64,8 @@ class Idle:
             rows.append(row)
         results.table(
             "process-wake-ups", "Wake-ups per minute when idle",
-            ["targets", "tolkwd", "monit", f"monit, every {USUAL_SECONDS} s", "its pings meanwhile"],
-            rows,
+            ["targets", "tolkwd", "monit", f"monit, every {USUAL_SECONDS} s",
+             "its pings meanwhile"], rows,
             f"Voluntary context switches of all threads in {passed:.0f} s, no ping due but in the "
             "last two columns. tolkwd's are the one-second ticks by which it counts to its "
             "refresh; its monitors sleep.")

@@ -8,8 +8,10 @@ processors; with --brief a few seconds, the figures of which mean nothing.
 """
 
 import argparse
+import contextlib
 import os
 import pathlib
+import signal
 import sys
 
 import cpu
@@ -36,19 +38,19 @@ def measure(programs, results):
 
     What loads the machine more than a little comes when no retry is due, or after the recovery.
     """
-    with idle.Idle(programs, SIZES) as sleepers:
-        with timing.Recovery(programs, services=7) as recovery:
+    with contextlib.ExitStack() as stack:
+        with idle.Idle(programs, SIZES) as sleepers:
+            recovery = stack.enter_context(timing.Recovery(programs, services=7))
             recovery.report_detection(results)
             cpu.cost_by_size(programs, results, [0, 1000, 10_000, 50_000], windows=7, pings=3)
             sleepers.report(results, seconds=60)
-            sleepers.__exit__(None, None, None)
-            timing.start_up(programs, results, [(1000, 3), (1, 7), (10, 7), (100, 7)])
-            costs = cpu.cpu_per_ping(programs, [(1, 1, 11), (10, 1, 11), (100, 2, 9)])
-            of_supervisord = memory.supervisord(programs, SIZES)
-            recovery.report_recovery(results)
+        timing.start_up(programs, results, [(1000, 3), (1, 7), (10, 7), (100, 7)])
+        costs = cpu.cpu_per_ping(programs, [(1, 1, 11), (10, 1, 11), (100, 2, 9)])
+        of_supervisord = memory.supervisord(programs, SIZES)
+        recovery.report_recovery(results)
     costs += cpu.cpu_per_ping(programs, [(1000, 10, 7)])
     cpu.report_cpu_per_ping(results, costs)
-    memory.memory(programs, results, SIZES, of_supervisord)
+    memory.memory(programs, results, SIZES, 3, of_supervisord)
 
 
 def measure_briefly(programs, results):
@@ -59,13 +61,14 @@ def measure_briefly(programs, results):
         sleepers.report(results, seconds=1)
     timing.start_up(programs, results, [(1, 1)])
     cpu.report_cpu_per_ping(results, cpu.cpu_per_ping(programs, [(1, 1, 1)]))
-    memory.memory(programs, results, [1], memory.supervisord(programs, [1]))
+    memory.memory(programs, results, [1], 1, memory.supervisord(programs, [1]))
 
 
 def main():
     asked = arguments()
     if os.geteuid() != 0:  # to look into what runs as root in the sandboxes
         os.execvp("sudo", ["sudo", sys.executable, *sys.argv])
+    signal.signal(signal.SIGTERM, lambda *_: sys.exit("terminated"))  # to leave nothing behind
     results = Results()
     programs = Programs(asked.tolkwd, asked.service)
     (measure_briefly if asked.brief else measure)(programs, results)

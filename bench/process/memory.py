@@ -9,9 +9,8 @@ import time
 import sandboxed
 from results import say
 
-ROUNDS = 3
 QUIET_SECONDS = 0.2
-SETTLING_SECONDS = 2
+SETTLING_SECONDS = 1
 ARENA_BYTES = 64 << 20  # what malloc reserves for the arena of a thread, and aligns it to
 
 MAPPING = re.compile(r"^([0-9a-f]+)-([0-9a-f]+) \S+ \S+ \S+ \S+ *(.*)$")
@@ -28,9 +27,9 @@ class Sizes:
     floor: dict = dataclasses.field(default_factory=dict)
 
 
-def settle(process, targets):
+def settle(process, pings):
     """Lets the process make its rounds."""
-    process.record.await_pings(ROUNDS * targets)
+    process.record.await_pings(pings)
     process.record.await_quiet(QUIET_SECONDS)
 
 
@@ -76,30 +75,30 @@ def breakdown(smaps, stack_bytes):
     return [[kind, kb, count[kind]] for kind, kb in size.most_common()]
 
 
-def _pair(programs, targets, interval, dependents):
+def _pair(programs, targets, dependents, interval, pings):
     """tolkwd's kB and mappings, and monit's kB; measured beside each other."""
     say(f"memory: tolkwd and monit, {targets} targets, {dependents} dependent each")
     with programs.tolkwd(targets, interval, dependents) as tolkwd, \
             programs.monit(targets, interval, dependents) as monit:
-        settle(tolkwd, targets)
+        settle(tolkwd, pings)
         ours, smaps, status = tolkwd.pss(), tolkwd.proc("smaps"), tolkwd.proc("status")
-        settle(monit, targets)
+        settle(monit, pings)
         return ours, monit.pss(), smaps, sandboxed.kilobytes(status, "VmPTE")
 
 
-def memory(programs, results, sizes, of_supervisord):
+def memory(programs, results, sizes, rounds, of_supervisord):
     """To be called while no other tolkwd runs: they would share pages, and seem smaller."""
     found = Sizes()
     stack_bytes = resource.getrlimit(resource.RLIMIT_STACK)[0]
     for targets in sizes:
-        interval = 3 if targets >= 1000 else 1
+        interval, pings = 3 if targets >= 1000 else 1, rounds * targets
         found.tolkwd[targets], found.monit[targets], smaps, tables = \
-            _pair(programs, targets, interval, 1)
+            _pair(programs, targets, 1, interval, pings)
         found.tolkwd_alone[targets], found.monit_alone[targets], *_ = \
-            _pair(programs, targets, interval, 0)
+            _pair(programs, targets, 0, interval, pings)
         say(f"memory: threads alone, {targets}")
         with programs.threadfloor(targets, interval) as floor:
-            settle(floor, targets)
+            settle(floor, pings)
             found.floor[targets] = floor.pss()
     results.table(
         "process-memory", "Proportional set size, kB",
@@ -107,7 +106,7 @@ def memory(programs, results, sizes, of_supervisord):
          "threads alone", "supervisord"],
         [[n, found.tolkwd[n], found.monit[n], found.tolkwd_alone[n], found.monit_alone[n],
           found.floor[n], of_supervisord[n]] for n in sizes],
-        f"After {ROUNDS} rounds of pings, between two rounds; a dependent service to each target "
+        f"After {rounds} rounds of pings, between two rounds; a dependent service to each target "
         "but where it says otherwise. Threads alone: a program that has a thread for each target, "
         "which runs the same command through the shell and pauses, and nothing else. supervisord: "
         "that many running children, which are not counted, limits raised by its own settings. "

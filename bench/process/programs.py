@@ -108,6 +108,11 @@ def supervisord_configuration(targets):
     return "".join(text)
 
 
+def descriptors_for(targets):
+    """The usual limit, or one that lets monit have its three for each target."""
+    return max(sandboxed.DESCRIPTORS, 3 * targets + 100)
+
+
 class Programs:
     """Starts each of the programs in a sandbox."""
 
@@ -119,12 +124,14 @@ class Programs:
         files = {"tolkwd.xml": tolkwd_configuration(targets, dependents, interval)}
         command = [f"/opt/programs/{self._tolkwd.name}", "-i", f"{sandboxed.FOLDER}/tolkwd.xml",
                    "-l", "/tmp/tolkwd.log", "-t", str(FOR_EVER)]
-        return sandboxed.Sandboxed(self._tools, command, files, [self._tolkwd], metered)
+        return sandboxed.Sandboxed(self._tools, command, files, [self._tolkwd], metered,
+                                   descriptors_for(targets))
 
     def monit(self, targets, interval, dependents=1, metered=False):
         files = {"monitrc": monit_configuration(targets, dependents, interval)}
         command = [MONIT, "-I", "-c", "/tmp/monitrc"]
-        return sandboxed.Sandboxed(self._tools, command, files, (), metered)
+        return sandboxed.Sandboxed(self._tools, command, files, (), metered,
+                                   descriptors_for(targets))
 
     def supervisord(self, targets):
         files = {"supervisord.conf": supervisord_configuration(targets)}

@@ -12,6 +12,10 @@ import time
 HERE = pathlib.Path(__file__).resolve().parent
 SANDBOX = HERE.parents[1] / "scripts" / "sandbox.sh"
 
+# The usual limit of a service. It counts: some programs close all descriptors that there could be
+# before they start a command, and with a limit of 20,000 a ping of theirs costs four times as much.
+DESCRIPTORS = 1024
+
 # Where a process sees, in its sandbox, what it is given.
 FOLDER = "/opt/bench"
 COMMANDS = "/opt/commands"
@@ -90,7 +94,8 @@ class Sandboxed:
     for. Everything ends with the `with` statement.
     """
 
-    def __init__(self, tools, command, files, programs=(), metered=False):
+    def __init__(self, tools, command, files, programs=(), metered=False,
+                 descriptors=DESCRIPTORS):
         self._tools = tools
         self._folder = pathlib.Path(tempfile.mkdtemp(prefix="tolkwd-bench."))
         self._folder.chmod(0o755)
@@ -104,11 +109,11 @@ class Sandboxed:
         if metered:
             self._next_meter()
             command = ["env", f"LD_PRELOAD={TOOLS}/cpumeter.so", *command]
-        self._process = subprocess.Popen(self._command_line(command, programs),
+        self._process = subprocess.Popen(self._command_line(command, programs, descriptors),
                                          stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL)
         self._pid = None
 
-    def _command_line(self, command, programs):
+    def _command_line(self, command, programs, descriptors):
         line = [SANDBOX, "--bind", self._folder, FOLDER,
                 "--ro-bind", self._tools / "service", f"{COMMANDS}/service",
                 "--ro-bind", HERE / "enter.sh", "/opt/enter.sh",
@@ -117,7 +122,7 @@ class Sandboxed:
             line += ["--ro-bind", self._tools / tool, f"{TOOLS}/{tool}"]
         for program in programs:
             line += ["--ro-bind", program, f"/opt/programs/{program.name}"]
-        return [*line, "--", "/opt/enter.sh", *command]
+        return [*line, "--", "/opt/enter.sh", str(descriptors), *command]
 
     def __enter__(self):
         return self

@@ -70,7 +70,7 @@ class Recovery:
     def __enter__(self):
         say(f"recovery: {len(self._names)} services die")
         self._daemon.__enter__()
-        self._daemon.record.await_pings(2 * len(self._names))
+        self._daemon.record.await_pings(len(self._names))
         for name in self._names:
             time.sleep(BETWEEN_DEATHS_SECONDS)
             self._deaths[name] = self._daemon.let_die(name)
