@@ -15,7 +15,7 @@ class Meter:
 
     def __init__(self, process):
         self._process = process
-        self._cpu = self._pings = 0
+        self._cpu, self._pings = (0, 0), 0
 
     def skip(self, pings):
         """Lets so many pings pass, at least, and waits for the end of the last one's commands."""
@@ -24,31 +24,53 @@ class Meter:
         self._cpu, self._pings = self._process.cpu(), self._process.record.pings()
 
     def window(self, pings):
-        """Microseconds per ping of the next pings."""
+        """Microseconds per ping of the next pings: of the process, and of its commands."""
         cpu, before = self._cpu, self._pings
         self.skip(pings)
-        return (self._cpu - cpu) / (self._pings - before)
+        return [(now - then) / (self._pings - before) for now, then in zip(self._cpu, cpu)]
 
 
-def _rounds(programs, targets, interval, rounds):
-    """Microseconds per ping in each round, of tolkwd and of monit.
+def _medians(windows):
+    """Of the processes themselves, and with their commands."""
+    return (round(statistics.median(own for own, _ in windows)),
+            round(statistics.median(own + commands for own, commands in windows)))
 
-    tolkwd keeps its own time. monit, whose one thread works through its list whenever it wakes, is
-    stopped while tolkwd has its round and goes on, its pause long over, when tolkwd has finished.
+
+def _rounds(free, driven, targets, rounds):
+    """The medians of a process that keeps its own time, and of others, all in turns.
+
+    The others have a single thread for all pings. Each is stopped, and goes on, its pause long
+    over, when the one before has finished its round. (Many threads would all wake at once then.)
     """
-    with programs.tolkwd(targets, interval, metered=True) as tolkwd, \
-            programs.monit(targets, 1, metered=True) as monit:
-        ours, theirs = Meter(tolkwd), Meter(monit)
-        theirs.skip(WARM_UP_ROUNDS * targets)
-        monit.stop()
-        ours.skip(WARM_UP_ROUNDS * targets)
-        found = [], []
-        for _ in range(rounds):
-            found[0].append(ours.window(targets))
-            monit.go_on()
-            found[1].append(theirs.window(targets))
-            monit.stop()
-        return found
+    free_meter, meters = Meter(free), [Meter(process) for process in driven]
+    for process, meter in zip(driven, meters):
+        meter.skip(WARM_UP_ROUNDS * targets)
+        process.stop()
+    free_meter.skip(WARM_UP_ROUNDS * targets)
+    found = [[] for _ in (free, *driven)]
+    for _ in range(rounds):
+        found[0].append(free_meter.window(targets))
+        for process, meter, windows in zip(driven, meters, found[1:]):
+            process.go_on()
+            windows.append(meter.window(targets))
+            process.stop()
+    return list(map(_medians, found))
+
+
+def cost_of_one(programs, results, rounds):
+    """Of one target, also what the command costs through the shell and nothing else."""
+    say(f"processor time per ping: 1 target, beside a thread alone, {rounds} rounds")
+    with programs.tolkwd(1, 2, metered=True) as tolkwd, \
+            programs.monit(1, 1, metered=True) as monit, \
+            programs.threadfloor(1, 1, metered=True) as floor:
+        found = _rounds(tolkwd, [monit, floor], 1, rounds)
+    results.table(
+        "process-cpu-floor", "Processor time of a ping, microseconds, one target",
+        ["program", "the program itself", "with its commands", "rounds"],
+        [[name, *medians, rounds]
+         for name, medians in zip(("tolkwd", "monit", "thread alone"), found)],
+        "Median over rounds, in turns. Thread alone: a program that runs the same command through "
+        "the shell and pauses, and nothing else: what the shell costs.")
 
 
 def cpu_per_ping(programs, plan):
@@ -56,17 +78,19 @@ def cpu_per_ping(programs, plan):
     rows = []
     for targets, interval, rounds in plan:
         say(f"processor time per ping: {targets} targets, {rounds} rounds")
-        ours, theirs = (statistics.median(side)
-                        for side in _rounds(programs, targets, interval, rounds))
-        say(f"    tolkwd {ours:.0f}, monit {theirs:.0f} microseconds")
-        rows.append([targets, round(ours), round(theirs), round(ours / theirs, 3), rounds])
+        with programs.tolkwd(targets, interval, metered=True) as tolkwd, \
+                programs.monit(targets, 1, metered=True) as monit:
+            (our_own, ours), (their_own, theirs) = _rounds(tolkwd, [monit], targets, rounds)
+        say(f"    tolkwd {ours}, monit {theirs} microseconds")
+        rows.append([targets, ours, our_own, theirs, their_own, round(ours / theirs, 3), rounds])
     return rows
 
 
 def report_cpu_per_ping(results, rows):
     results.table(
         "process-cpu", "Processor time per ping, microseconds",
-        ["targets", "tolkwd", "monit", "tolkwd / monit", "rounds"], rows,
+        ["targets", "tolkwd", "of it tolkwd itself", "monit", "of it monit itself",
+         "tolkwd / monit", "rounds"], rows,
         "Median over rounds, in turns. All time of the program and of its commands, by getrusage "
         "of the process itself and of its ended children, which a thread loaded into both asks "
         "for (/proc gives the children's in ticks of 10 ms only); divided by the pings that the "
@@ -76,8 +100,8 @@ def report_cpu_per_ping(results, rows):
         "it closes as many before each command, so its figure grows with the limit.")
     results.curve("cpu", "Processor time per ping", ("targets", "microseconds"),
                   {"tolkwd": [[row[0], row[1]] for row in rows],
-                   "monit": [[row[0], row[2]] for row in rows]})
-    for targets, _, _, ratio, _ in rows:
+                   "monit": [[row[0], row[3]] for row in rows]})
+    for targets, _, _, _, _, ratio, _ in rows:
         results.at_most(f"cpu-per-ping-below-monit-{targets}",
                         f"processor time per ping below monit's, {targets} targets", ratio, 1.0)
 
@@ -92,15 +116,14 @@ def cost_by_size(programs, results, sizes, windows, pings):
         for meter in meters:
             meter.skip(WARM_UP_ROUNDS)
         found = [[meter.window(pings) for meter in meters] for _ in range(windows)]
-        costs = [round(statistics.median(side)) for side in zip(*found)]
-        rows = [[count, process.pss(), cost]
-                for count, process, cost in zip(sizes, processes, costs)]
+        rows = [[count, process.own_memory(), *_medians(side)]
+                for count, process, side in zip(sizes, processes, zip(*found))]
     results.table(
         "process-cpu-by-size", "Processor time per ping as the daemon grows",
-        ["dependents in the configuration", "proportional set size, kB", "microseconds per ping"],
-        rows,
+        ["dependents in the configuration", "own memory, kB", "microseconds, the daemon itself",
+         "microseconds, with its commands"], rows,
         f"One target. Median of {windows} windows of {pings} pings, all sizes beside each other. "
-        "To start a command no page of the daemon is copied.")
+        "To start a command no page of the daemon is copied. Own memory: what is in no file.")
     results.curve("cpu-by-size", "Processor time per ping as the daemon grows",
-                  ("proportional set size, kB", "microseconds"),
-                  {"tolkwd": [row[1:] for row in rows]})
+                  ("own memory, kB", "microseconds"),
+                  {"tolkwd": [[row[1], row[3]] for row in rows]})

@@ -8,6 +8,7 @@ processors; with --brief a few seconds, the figures of which mean nothing.
 """
 
 import argparse
+import concurrent.futures
 import contextlib
 import os
 import pathlib
@@ -45,6 +46,7 @@ def measure(programs, results):
             cpu.cost_by_size(programs, results, [0, 1000, 10_000, 50_000], windows=7, pings=3)
             sleepers.report(results, seconds=60)
         timing.start_up(programs, results, [(1000, 3), (1, 7), (10, 7), (100, 7)])
+        cpu.cost_of_one(programs, results, rounds=9)
         costs = cpu.cpu_per_ping(programs, [(1, 1, 11), (10, 1, 11), (100, 2, 9)])
         of_supervisord = memory.supervisord(programs, SIZES)
         recovery.report_recovery(results)
@@ -54,14 +56,28 @@ def measure(programs, results):
 
 
 def measure_briefly(programs, results):
-    """The same at the smallest size, and no recovery to its end."""
-    with idle.Idle(programs, [1]) as sleepers, timing.Recovery(programs, services=1) as recovery:
-        recovery.report_detection(results)
-        cpu.cost_by_size(programs, results, [0, 100], windows=1, pings=1)
-        sleepers.report(results, seconds=1)
-    timing.start_up(programs, results, [(1, 1)])
-    cpu.report_cpu_per_ping(results, cpu.cpu_per_ping(programs, [(1, 1, 1)]))
-    memory.memory(programs, results, [1], 1, memory.supervisord(programs, [1]))
+    """The same at the smallest size, all at once, and no recovery to its end."""
+    def sleepers():
+        with idle.Idle(programs, [1]) as processes:
+            processes.report(results, seconds=1)
+
+    def detection():
+        with timing.Recovery(programs, services=1) as recovery:
+            recovery.report_detection(results)
+
+    def costs():
+        cpu.report_cpu_per_ping(results, cpu.cpu_per_ping(programs, [(1, 1, 1)]))
+
+    def sizes():
+        memory.memory(programs, results, [1], 1, memory.supervisord(programs, [1]))
+
+    steps = [sleepers, detection, costs, sizes,
+             lambda: cpu.cost_by_size(programs, results, [0, 100], windows=1, pings=1),
+             lambda: timing.start_up(programs, results, [(1, 1)]),
+             lambda: cpu.cost_of_one(programs, results, rounds=1)]
+    with concurrent.futures.ThreadPoolExecutor(len(steps)) as pool:
+        for running in [pool.submit(step) for step in steps]:
+            running.result()
 
 
 def main():

@@ -138,6 +138,6 @@ class Programs:
         command = [SUPERVISORD, "-c", f"{sandboxed.FOLDER}/supervisord.conf"]
         return sandboxed.Sandboxed(self._tools, command, files)
 
-    def threadfloor(self, threads, interval):
+    def threadfloor(self, threads, interval, metered=False):
         command = [f"{sandboxed.TOOLS}/threadfloor", str(threads), str(interval)]
-        return sandboxed.Sandboxed(self._tools, command, {})
+        return sandboxed.Sandboxed(self._tools, command, {}, (), metered)

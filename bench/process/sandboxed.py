@@ -173,17 +173,21 @@ class Sandboxed:
         """Proportional set size, in kB."""
         return kilobytes(self.proc("smaps_rollup"), "Pss")
 
+    def own_memory(self):
+        """What it shares with nobody and has in no file, in kB."""
+        return kilobytes(self.proc("smaps_rollup"), "Pss_Anon")
+
     def pauses(self):
         """How often its threads have gone to sleep so far."""
         return sum(kilobytes(path.read_text(), "voluntary_ctxt_switches")
                    for path in self._proc.glob("task/*/status"))
 
     def cpu(self):
-        """Processor time of the process and of its ended children so far, in microseconds."""
+        """Microseconds of processor time so far: its own, and those of its ended children."""
         meter = self._folder / f"cpu.{self._meters - 1}"
         self._next_meter()
         own, children = meter.read_text(encoding="ascii").split()
-        return int(own) + int(children)
+        return int(own), int(children)
 
     def _next_meter(self):
         os.mkfifo(self._folder / f"cpu.{self._meters}")
