@@ -26,7 +26,8 @@ public:
     // A message of level kLevelDebug is dropped unless debugenable is set, but the file is opened
     // (and emptied, if it is over its limit) all the same. A failing write is not reported: the
     // daemon carries on. A file that cannot be opened ends the process with status 200 after one
-    // line on standard error. Any thread; threads take turns on standard output, none on the file.
+    // line on standard error. Any thread; threads take turns on a standard output that somebody
+    // reads, and on no file.
     static void LogMessage(std::string module, int level, std::string message);
 
     // Where the messages go. Set by the constructor; read by every thread, so change it only while
