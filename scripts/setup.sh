@@ -29,10 +29,10 @@ missing_packages() {
     done <"$root/scripts/packages.txt"
 }
 
-# Services that the demonstration and the tests alone need. Where their packages bring them, they
+# Services that the demonstration, the tests and the benchmarks alone need. Where their packages bring them, they
 # are neither started nor enabled at boot; where the machine had them before, they are left as they
 # are.
-readonly demo_services=(cron nginx redis-server)
+readonly demo_services=(cron monit nginx redis-server supervisor)
 readonly guard=/usr/sbin/policy-rc.d
 readonly guard_mark='# made by the setup of tolkwd, for the time of an installation'
 new_services=()
