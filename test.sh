@@ -1,18 +1,23 @@
 #!/usr/bin/env bash
 # Sets up, builds with warnings as errors, and runs all tests: under the address and undefined-
-# behaviour sanitizers, under the thread sanitizer, and as released; then lets each fuzzer run. Takes
-# about a quarter of an hour. Longer fuzzing: tests/fuzz/CMakeLists.txt; the whole soak:
+# behaviour sanitizers, under the thread sanitizer, and as released, the benchmarks once and briefly
+# among them; then lets each fuzzer run. Takes about a quarter of an hour. Longer fuzzing: tests/fuzz/CMakeLists.txt; the whole soak:
 # tests/system/CMakeLists.txt; valgrind: tests/memcheck.sh; mutants: tests/mutation/run.py.
 set -euo pipefail
 # shellcheck source=scripts/setup.sh
 . "$(dirname "$0")/scripts/setup.sh"
 
-setup build demo test
+setup build demo test bench
 for preset in asan tsan release fuzz; do
     printf '\n== %s\n' "$preset"
-    build "$preset" -DTOLKWD_WERROR=ON -DBUILD_TESTING=ON
+    bench=OFF
+    [ "$preset" != release ] || bench=ON
+    build "$preset" -DTOLKWD_WERROR=ON -DBUILD_TESTING=ON -DTOLKWD_BENCH="$bench"
     (cd "$root" && ctest --preset "$preset")
 done
 
 printf '\n== what the soak measured\n'
 grep -h ' refreshes, ' "$root/build/release/Testing/Temporary/LastTest.log"
+
+printf '\n== instructions of each piece of work\n'
+"$root/bench/counts/compare.py" --program "$root/build/release/bench/counts/bench_counts"
