@@ -124,6 +124,9 @@ def cost_by_size(programs, results, sizes, windows, pings):
          "microseconds, with its commands"], rows,
         f"One target. Median of {windows} windows of {pings} pings, all sizes beside each other. "
         "To start a command no page of the daemon is copied. Own memory: what is in no file.")
+    results.at_most("cpu-per-ping-by-size", "processor time per ping with "
+                    f"{sizes[-1]:,} dependents in the configuration, to that with {sizes[0]}",
+                    round(rows[-1][3] / rows[0][3], 3), 1.1)
     results.curve("cpu-by-size", "Processor time per ping as the daemon grows",
                   ("own memory, kB", "microseconds"),
                   {"tolkwd": [[row[1], row[3]] for row in rows]})

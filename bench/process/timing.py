@@ -1,5 +1,6 @@
 """How soon things happen: the first pings, and the start of a service that has died."""
 
+import contextlib
 import statistics
 import time
 
@@ -59,25 +60,44 @@ def start_up(programs, results, plan):
                    "monit": [[row[0], row[4]] for row in rows]}, logy=True)
 
 
+def check_that_monit_restarts(programs):
+    """The peer must do what it is measured for: restart a dead service, and its dependent."""
+    say("monit must restart a service")
+    with programs.monit(1, 1) as monit:
+        monit.record.await_pings(1)
+        monit.let_die("s1")
+        for name in ("s1", "d1"):
+            wait_until(lambda: monit.record.first(_is_start_of(name)), f"start of {name} by monit")
+
+
+def _is_start_of(name):
+    return lambda entry: entry.name == name and entry.verb == "start"
+
+
 class Recovery:
     """Services that die one after the other, under a daemon that goes on beside what follows."""
 
     def __init__(self, programs, services):
-        self._daemon = programs.tolkwd(services, RECOVERY_INTERVAL)
+        self._programs = programs
         self._names = [f"s{number}" for number in range(1, services + 1)]
+        self._stack = contextlib.ExitStack()
+        self._daemon = None
         self._deaths = {}
 
     def __enter__(self):
         say(f"recovery: {len(self._names)} services die")
-        self._daemon.__enter__()
-        self._daemon.record.await_pings(len(self._names))
-        for name in self._names:
-            time.sleep(BETWEEN_DEATHS_SECONDS)
-            self._deaths[name] = self._daemon.let_die(name)
+        with contextlib.ExitStack() as stack:
+            self._daemon = stack.enter_context(
+                self._programs.tolkwd(len(self._names), RECOVERY_INTERVAL))
+            self._daemon.record.await_pings(len(self._names))
+            for name in self._names:
+                time.sleep(BETWEEN_DEATHS_SECONDS)
+                self._deaths[name] = self._daemon.let_die(name)
+            self._stack = stack.pop_all()
         return self
 
     def __exit__(self, *error):
-        self._daemon.__exit__(*error)
+        return self._stack.__exit__(*error)
 
     def _missed(self, name):
         """The first ping that found it dead, or None."""
@@ -85,8 +105,7 @@ class Recovery:
             lambda entry: entry.name == name and entry.answer == "stopped")
 
     def _started(self, name):
-        return self._daemon.record.first(
-            lambda entry: entry.name == name and entry.verb == "start")
+        return self._daemon.record.first(_is_start_of(name))
 
     def _await_all(self, event, what, patience):
         say(f"recovery: until all {what}")
