@@ -82,6 +82,11 @@ def goal(ident, text, measured, limit, sense="at most"):
             "unit": "ratio", "sense": sense}
 
 
+def counted(targets):
+    """So many targets, in words."""
+    return "one target" if targets == 1 else f"{targets:,} targets"
+
+
 def lines(results):
     """One log line against its system calls alone."""
     rows, goals = [], []
@@ -142,9 +147,9 @@ def records(results):
                                 for peer in readers[1:])
         rows.append([size, *(round(results.time(f"records/{who}/{size}") * MICROSECONDS, 1)
                              for who in readers), round(to_expat, 2), round(to_pugixml, 2)])
-        goals += [goal(f"expat-{size}", f"reading {size:,} targets, to expat's time", to_expat,
+        goals += [goal(f"expat-{size}", f"reading {counted(size)}, to expat's time", to_expat,
                        0.35),
-                  goal(f"pugixml-{size}", f"reading {size:,} targets, to pugixml's time",
+                  goal(f"pugixml-{size}", f"reading {counted(size)}, to pugixml's time",
                        to_pugixml, 1.0)]
     curve = {"id": "records", "title": "Reading a configuration", "xlabel": "targets",
              "ylabel": "microseconds per target", "logx": True, "logy": False,

@@ -122,7 +122,9 @@ def memory(programs, results, sizes, rounds, of_supervisord):
               "supervisord": of_supervisord}
     results.curve("memory", "Proportional set size", ("targets", "kB"),
                   {name: [[n, kb[n]] for n in sizes] for name, kb in series.items()}, logy=True)
-    for n in sizes:
-        results.at_most(f"memory-below-monit-{n}",
-                        f"proportional set size below monit's, {n} targets",
-                        round(found.tolkwd[n] / found.monit[n], 3), 1.0)
+    for kind, ours, theirs in (("one dependent each", found.tolkwd, found.monit),
+                               ("no dependents", found.tolkwd_alone, found.monit_alone)):
+        for n in sizes:
+            results.at_most(f"memory-below-monit-{n}-{kind.replace(' ', '-')}",
+                            f"proportional set size to monit's, {n:,} targets, {kind}",
+                            round(ours[n] / theirs[n], 3), 1.0)

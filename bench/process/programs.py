@@ -37,7 +37,7 @@ set logfile /tmp/monit.log
 """
 
 MONIT_SERVICE = """\
-check program s{number} with path "{service} s{number} status"
+check program s{number} with path "{status}"
   start program = "{service} s{number} start"
   stop program = "{service} s{number} stop"
   if status != 0 for 3 cycles then restart
@@ -91,11 +91,18 @@ def tolkwd_configuration(targets, dependents, interval):
     return "".join([*text, "</wdtargets>\n"])
 
 
-def monit_configuration(targets, dependents, interval):
+# What tolkwd runs, to the letter, but for the file's folder.
+COMMAND_LINE = "service {name} status 1>/tmp/agent.{name} 2>/tmp/agent.{name}"
+
+
+def monit_configuration(targets, dependents, interval, through_shell):
     service = f"{sandboxed.COMMANDS}/service"
     text = [MONIT_HEAD.format(interval=interval)]
     for number in range(1, targets + 1):
-        text.append(MONIT_SERVICE.format(number=number, service=service))
+        status = f"{service} s{number} status"
+        if through_shell:
+            status = f"/bin/sh -c '{COMMAND_LINE.format(name=f's{number}')}'"
+        text.append(MONIT_SERVICE.format(number=number, service=service, status=status))
         if dependents:
             text.append(MONIT_DEPENDENT.format(number=number, service=service))
     return "".join(text)
@@ -127,8 +134,8 @@ class Programs:
         return sandboxed.Sandboxed(self._tools, command, files, [self._tolkwd], metered,
                                    descriptors_for(targets))
 
-    def monit(self, targets, interval, dependents=1, metered=False):
-        files = {"monitrc": monit_configuration(targets, dependents, interval)}
+    def monit(self, targets, interval, dependents=1, metered=False, through_shell=False):
+        files = {"monitrc": monit_configuration(targets, dependents, interval, through_shell)}
         command = [MONIT, "-I", "-c", "/tmp/monitrc"]
         return sandboxed.Sandboxed(self._tools, command, files, (), metered,
                                    descriptors_for(targets))

@@ -42,14 +42,16 @@ class Record:
         path.touch()
         path.chmod(0o666)
         self._stream = path.open(encoding="ascii")
+        self._begun = ""
         self._entries = []
         self._pings = 0
 
     def entries(self):
-        """All entries so far."""
-        for line in self._stream.readlines():
+        """All entries so far. The last line may still be on its way."""
+        *lines, self._begun = (self._begun + self._stream.read()).split("\n")
+        for line in lines:
             words = line.split()
-            if not line.endswith("\n") or len(words) != 4:
+            if len(words) != 4:
                 raise ValueError(f"a torn line in the record: {line!r}")
             self._entries.append(Entry(int(words[0]), *words[1:]))
             self._pings += words[2] == "status"

@@ -20,12 +20,12 @@ ROOT = pathlib.Path(__file__).resolve().parents[2]
 PLACE = re.compile(r"(<!-- (table:[\w-]+|goals|machine) -->\n).*?(<!-- end -->)", re.DOTALL)
 
 PLOT = """\
-set terminal svg size 760,430 font 'sans-serif,13' background '#ffffff'
+set terminal svg size 860,400 font 'sans-serif,13' background '#ffffff'
 set output '{path}'
 set title "{title}"
 set xlabel "{xlabel}"
 set ylabel "{ylabel}"
-set key {key}
+set key outside right center vertical Left reverse samplen 2
 set grid back linecolor '#dddddd'
 set border 3
 set tics nomirror
@@ -108,8 +108,8 @@ def draw(curve, folder):
         scale += "set yrange [0:*]\n"
     path = folder / f"{curve['id']}.svg"
     script = data + PLOT.format(path=path, title=curve["title"], xlabel=curve["xlabel"],
-                                ylabel=curve["ylabel"], key="outside bottom center horizontal",
-                                scale=scale, series=", \\\n     ".join(parts))
+                                ylabel=curve["ylabel"], scale=scale,
+                                series=", \\\n     ".join(parts))
     subprocess.run(["gnuplot"], input=script, text=True, check=True)
 
 
