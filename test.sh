@@ -1,8 +1,10 @@
 #!/usr/bin/env bash
 # Sets up, builds with warnings as errors, and runs all tests: under the address and undefined-
 # behaviour sanitizers, under the thread sanitizer, and as released, the benchmarks once and briefly
-# among them; then lets each fuzzer run. Takes about a quarter of an hour. Longer fuzzing: tests/fuzz/CMakeLists.txt; the whole soak:
-# tests/system/CMakeLists.txt; valgrind: tests/memcheck.sh; mutants: tests/mutation/run.py.
+# among them; lets each fuzzer run; and compares instruction counts with those kept. Takes about a
+# quarter of an hour. Longer fuzzing: tests/fuzz/CMakeLists.txt; the whole soak:
+# tests/system/CMakeLists.txt; valgrind: tests/memcheck.sh; mutants: tests/mutation/run.py; figures:
+# bench/run.sh.
 set -euo pipefail
 # shellcheck source=scripts/setup.sh
 . "$(dirname "$0")/scripts/setup.sh"

@@ -1,4 +1,4 @@
-# Sourced by run.sh and test.sh: installs what is missing on a Debian machine, and builds.
+# Sourced by run.sh, test.sh and the like: installs what is missing on a Debian machine, and builds.
 # shellcheck shell=bash
 
 root=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
@@ -29,10 +29,10 @@ missing_packages() {
     done <"$root/scripts/packages.txt"
 }
 
-# Services that the demonstration, the tests and the benchmarks alone need. Where their packages bring them, they
-# are neither started nor enabled at boot; where the machine had them before, they are left as they
-# are.
-readonly demo_services=(cron monit nginx redis-server supervisor)
+# Services that the demonstration, the tests and the benchmarks alone need. Where their packages
+# bring them, they are neither started nor enabled at boot; where the machine had them before, they
+# are left as they are.
+readonly borrowed_services=(cron monit nginx redis-server supervisor)
 readonly guard=/usr/sbin/policy-rc.d
 readonly guard_mark='# made by the setup of tolkwd, for the time of an installation'
 new_services=()
@@ -58,7 +58,7 @@ after_installing() {
 
 install_quietly() {
     local service
-    for service in "${demo_services[@]}"; do
+    for service in "${borrowed_services[@]}"; do
         [ -e "/etc/init.d/$service" ] || new_services+=("$service")
     done
     trap after_installing EXIT

@@ -13,7 +13,6 @@
 #include <fcntl.h>
 #include <poll.h>
 #include <pthread.h>
-#include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -33,16 +32,31 @@ constexpr int kLogUnavailableStatus = 200;
 constexpr int kReaderPatienceMilliseconds = 5000;
 constexpr int kReaderWaitMilliseconds = 500;
 
-// Keeps the failed writes of the calling thread from ending the process: a pipe without a reader
-// (SIGPIPE), a file at its size limit (SIGXFSZ). Not by ignoring these signals, which the services
-// that the daemon starts would inherit.
+// Keeps a write to a file at its size limit from ending the process. Not by ignoring the signal,
+// which the services that the daemon starts would inherit; what is caught is as ever for them.
+// Where it is ignored already, by whoever started the daemon, it stays so. Always true.
+bool catchsizelimit()
+{
+    struct sigaction before {};
+    sigaction(SIGXFSZ, nullptr, &before);
+    if (before.sa_handler == SIG_DFL) {
+        struct sigaction caught {};
+        caught.sa_handler = [](int) {
+        };
+        caught.sa_flags = SA_RESTART;
+        sigaction(SIGXFSZ, &caught, nullptr);
+    }
+    return true;
+}
+
+// Keeps the writes of the calling thread to a pipe without a reader from ending the process. This
+// signal tells only of those: caught, it would be lost from whoever sends it on purpose.
 class writesignalguard {
 public:
     writesignalguard()
     {
         sigemptyset(&signals);
         sigaddset(&signals, SIGPIPE);
-        sigaddset(&signals, SIGXFSZ);
         pthread_sigmask(SIG_BLOCK, &signals, &before);
     }
     ~writesignalguard() { pthread_sigmask(SIG_SETMASK, &before, nullptr); }
@@ -67,21 +81,14 @@ private:
 struct sink {
     enum manner {
         kFile,   // has places to seek to: its writes do not wait, and it has no reader
-        kPlain,  // its writes do not wait: it was opened so
+        kPlain,  // its writes do not wait: it was opened so, or it is no kind of stream
         kSocket, // each write has to say that it shall not wait, nor raise a signal
         kAsked,  // it could wait, so it is asked for room before each write
     };
     int fd;
     manner how;
-    bool raises;              // a failing write can raise one of the guard's signals
     std::atomic<bool>& stuck; // its reader had stopped reading
 };
-
-bool filesarelimited()
-{
-    rlimit limit{};
-    return getrlimit(RLIMIT_FSIZE, &limit) != 0 || limit.rlim_cur != RLIM_INFINITY;
-}
 
 bool isfile(int fd)
 {
@@ -116,8 +123,9 @@ ssize_t writesome(const sink& to, std::string_view text)
 // number of what kept the text, or the rest of it, from being written.
 int deliver(const sink& to, std::string_view text)
 {
+    [[maybe_unused]] static const bool caught = catchsizelimit();
     std::optional<writesignalguard> guard;
-    if (to.raises) {
+    if (to.how == sink::kPlain || to.how == sink::kAsked) {
         guard.emplace();
     }
     int patience = to.stuck ? 0 : kReaderPatienceMilliseconds;
@@ -152,23 +160,24 @@ sink streamsink(int fd, std::atomic<bool>& stuck)
     struct stat kind {};
     fstat(fd, &kind);
     if (S_ISSOCK(kind.st_mode)) {
-        return {fd, sink::kSocket, false, stuck};
+        return {fd, sink::kSocket, stuck};
     }
     if (!S_ISFIFO(kind.st_mode) && isatty(fd) != 1) {
-        return {fd, sink::kPlain, true, stuck};
+        return {fd, sink::kPlain, stuck};
     }
     const std::string path = "/proc/self/fd/" + std::to_string(fd);
     const int own = open(path.c_str(), O_WRONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
     if (own < 0) {
-        return {fd, sink::kAsked, true, stuck}; // another user's, or no descriptor left
+        // Another user's, a named pipe that its reader has left, or no descriptor is left.
+        return {fd, sink::kAsked, stuck};
     }
-    return {own, sink::kPlain, true, stuck};
+    return {own, sink::kPlain, stuck};
 }
 
 // How to write to standard output or standard error; its `fd` is to be closed where it is another.
 sink standardsink(int fd, std::atomic<bool>& stuck)
 {
-    return isfile(fd) ? sink{fd, sink::kFile, filesarelimited(), stuck} : streamsink(fd, stuck);
+    return isfile(fd) ? sink{fd, sink::kFile, stuck} : streamsink(fd, stuck);
 }
 
 // Nobody will read this stream again. A service that is started with it would be killed by the
@@ -271,20 +280,20 @@ asctimetext asctimeof(std::time_t when)
     return text;
 }
 
-// What a line needs besides its message. Finding it out takes as long as writing the line, and it
-// hardly ever changes but for the time: each thread looks once a second.
+// What a line needs besides its message. Finding it out is dear, and it hardly ever changes but for
+// the time: each thread looks once a second. Nobody but a debugger makes a stream of a standard
+// output that was a file.
 struct circumstances {
     std::time_t second;
     asctimetext date;
     bool outputisfile; // standard output is
-    bool filesarelimited;
 
     // Valid until this thread's next call.
     static const circumstances& at(std::time_t now)
     {
         thread_local std::optional<circumstances> last;
         if (!last || last->second != now) {
-            last = {now, asctimeof(now), isfile(STDOUT_FILENO), ::filesarelimited()};
+            last = {now, asctimeof(now), isfile(STDOUT_FILENO)};
         }
         return *last;
     }
@@ -326,7 +335,8 @@ wdLocalLog::wdLocalLog(const std::string& path)
     logFilePath = path;
 }
 
-// Into a file, threads need not take turns: the system does not mix the bytes of two writes.
+// Into a file, threads need not take turns: the system does not mix the bytes of two writes. (Only
+// a line that a full disk has cut short, and that goes on when there is room, can be parted.)
 void wdLocalLog::LogMessage(std::string module, int level, std::string message)
 {
     static std::atomic<bool> logstuck = false; // only ever true where the log is a pipe or so
@@ -337,12 +347,11 @@ void wdLocalLog::LogMessage(std::string module, int level, std::string message)
         const circumstances& here = circumstances::at(now);
         const std::string line = composeline(here.date, level, module, message);
         if (here.outputisfile) {
-            deliver({STDOUT_FILENO, sink::kFile, here.filesarelimited, neverstuck}, line);
+            deliver({STDOUT_FILENO, sink::kFile, neverstuck}, line);
         } else {
             writestandard(STDOUT_FILENO, line);
         }
-        const bool raises = log.how != sink::kFile || here.filesarelimited;
-        deliver({log.fd, log.how, raises, logstuck}, line);
+        deliver({log.fd, log.how, logstuck}, line);
     }
     close(log.fd);
 }

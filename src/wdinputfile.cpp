@@ -3,7 +3,6 @@
 #include <cerrno>
 
 #include <fcntl.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
 wdinputfile::wdinputfile(const std::string& path) noexcept
@@ -21,13 +20,6 @@ wdinputfile::~wdinputfile()
 bool wdinputfile::isopen() const noexcept
 {
     return fd >= 0;
-}
-
-std::size_t wdinputfile::size() const noexcept
-{
-    struct stat found {};
-    const bool known = fstat(fd, &found) == 0 && S_ISREG(found.st_mode);
-    return known ? static_cast<std::size_t>(found.st_size) : 0;
 }
 
 // Not const: it moves on in the file.

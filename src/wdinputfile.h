@@ -20,9 +20,6 @@ public:
 
     [[nodiscard]] bool isopen() const noexcept;
 
-    // The size in bytes; 0 where it is not known, as for a pipe.
-    [[nodiscard]] std::size_t size() const noexcept;
-
     // The next bytes, as many as there are and `block` can hold, valid as long as it is. None at
     // the end, or where the file cannot be read.
     std::string_view read(std::span<char> block) noexcept;

@@ -1,9 +1,10 @@
 // The two records that carry what the configuration says: one service, and one unit of monitoring.
 //
 // Plain values, copied freely: the lists of the reader, the manager's list and every monitor
-// thread hold copies of their own. All values stay the text that the file gave; whoever needs a
-// number converts it at each use, and text without a number counts as 0 there. Two service records
-// denote the same service when their names are equal byte for byte.
+// thread hold copies of their own (which share their texts, see wdtext.h). All values stay the text
+// that the file gave; whoever needs a number converts it at each use, and text without a number
+// counts as 0 there. Two service records denote the same service when their names are equal byte
+// for byte.
 #pragma once
 
 #include <string>

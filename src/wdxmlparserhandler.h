@@ -42,5 +42,6 @@ void endElement(const std::string& name);
 void endDocument();
 
 // Appends a copy of `candidate` to `services` and returns 1, unless a service of that name is
-// there already: then 0, and nothing changes.
+// there already: then 0, and nothing changes. Searches the whole list: endDocument, which adds
+// thousands, keeps an index instead.
 int addservice(const service& candidate, std::vector<service>& services);

@@ -66,12 +66,8 @@ public:
     // Nothing before `place` will be asked for any more.
     void finishedto(std::size_t place) { needed = place; }
 
-    // The place of the text's first "?" from its third character on, or npos; `within` is a place
-    // that has been reached, and the "?" is looked for beyond it only where it is the text's start.
-    std::size_t firstmark(std::size_t within)
-    {
-        return mark == npos && within == 0 ? find('?', kBehindMark) : mark;
-    }
+    // The place of the text's first "?" from its third character on, or npos.
+    std::size_t firstmark() { return mark == npos ? find('?', kBehindMark) : mark; }
 
 private:
     [[nodiscard]] std::string_view held() const { return {window.get(), limit - start}; }
@@ -120,7 +116,7 @@ private:
     // Drops what is finished with; grows where that is less than half.
     void makeroom()
     {
-        const std::string_view rest = held().substr(std::min(needed, limit) - start);
+        const std::string_view rest = held().substr(needed - start);
         if (rest.size() > room / 2) {
             room *= 2;
             auto larger = std::make_unique_for_overwrite<char[]>(room);
@@ -184,7 +180,7 @@ private:
     {
         constexpr std::size_t kMarkAndBracket = 2;
         constexpr std::size_t kSecondCharacter = 1;
-        const std::size_t mark = text.firstmark(cur);
+        const std::size_t mark = text.firstmark();
         const std::size_t behind = mark == npos ? kSecondCharacter : mark + kMarkAndBracket;
         if (behind >= cur) {
             pos = behind;

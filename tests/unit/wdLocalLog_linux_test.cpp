@@ -21,6 +21,7 @@
 #include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include "daemontest.h"
@@ -500,6 +501,20 @@ TEST_F(StandardOutput, PipeWithoutReaderDoesNotEndTheProcess)
     EXPECT_EQ(action.sa_handler, SIG_DFL);
 }
 
+// Such a pipe cannot be opened anew.
+TEST_F(StandardOutput, NamedPipeWithoutReaderIsReplacedByNull)
+{
+    const std::string name = folder.path("pipe");
+    ASSERT_EQ(mkfifo(name.c_str(), 0600), 0);
+    const int reader = open(name.c_str(), O_RDONLY | O_NONBLOCK);
+    const int writer = open(name.c_str(), O_WRONLY);
+    dup2(writer, STDOUT_FILENO);
+    close(writer);
+    close(reader);
+    wdLocalLog::LogMessage("m", kLevelInfo, "heard by nobody");
+    EXPECT_EQ(std::filesystem::read_symlink("/proc/self/fd/1"), "/dev/null");
+}
+
 // Services inherit it: init scripts that print would be killed before they have started anything.
 TEST_F(StandardOutput, PipeWithoutReaderIsReplacedByNull)
 {
@@ -628,9 +643,44 @@ TEST_F(LocalLogDeath, SizeLimitSetMeanwhileDoesNotEndTheProcess)
         {
             wdLocalLog::LogMessage("m", kLevelInfo, "x");
             setrlimit(RLIMIT_FSIZE, &onebyte);
-            ++world.now;
             wdLocalLog::LogMessage("m", kLevelInfo, "x");
             _exit(7);
+        },
+        ::testing::ExitedWithCode(7), "");
+}
+
+TEST_F(LocalLogDeath, StandardErrorAtItsSizeLimitDoesNotEndTheProcess)
+{
+    const rlimit onebyte{1, 1};
+    EXPECT_EXIT(
+        {
+            const int errors = open(folder.path("errors").c_str(), O_WRONLY | O_CREAT, 0600);
+            dup2(errors, STDERR_FILENO);
+            setrlimit(RLIMIT_FSIZE, &onebyte);
+            writestandard(STDERR_FILENO, "xx");
+            _exit(7);
+        },
+        ::testing::ExitedWithCode(7), "");
+}
+
+// They are not told of the daemon's arrangements.
+TEST_F(LocalLog, ServicesEndAtTheirSizeLimitAsEver)
+{
+    wdLocalLog::LogMessage("m", kLevelInfo, "x");
+    const int status = runforreal("kill -XFSZ $$");
+    EXPECT_TRUE(WIFSIGNALED(status));
+    EXPECT_EQ(WTERMSIG(status), SIGXFSZ);
+}
+
+TEST_F(LocalLogDeath, IgnoredSizeLimitStaysIgnored)
+{
+    EXPECT_EXIT(
+        {
+            (void)std::signal(SIGXFSZ, SIG_IGN);
+            wdLocalLog::LogMessage("m", kLevelInfo, "x");
+            struct sigaction action {};
+            sigaction(SIGXFSZ, nullptr, &action);
+            _exit(action.sa_handler == SIG_IGN ? 7 : 8);
         },
         ::testing::ExitedWithCode(7), "");
 }

@@ -29,7 +29,6 @@ TEST_F(InputFile, MissingFileIsNotOpenAndGivesNothing)
 {
     wdinputfile file(folder.path("missing"));
     EXPECT_FALSE(file.isopen());
-    EXPECT_EQ(file.size(), 0U);
     EXPECT_EQ(readall(file), "");
 }
 
@@ -39,7 +38,6 @@ TEST_F(InputFile, IsReadPieceByPiece)
     folder.write("file", content);
     wdinputfile file(folder.path("file"));
     EXPECT_TRUE(file.isopen());
-    EXPECT_EQ(file.size(), 10U);
     EXPECT_EQ(readall(file), content);
 }
 
@@ -47,18 +45,16 @@ TEST_F(InputFile, FolderOpensAndGivesNothing)
 {
     wdinputfile file(folder.path());
     EXPECT_TRUE(file.isopen());
-    EXPECT_EQ(file.size(), 0U);
     EXPECT_EQ(readall(file), "");
 }
 
-TEST_F(InputFile, SizeOfAPipeIsNotKnown)
+TEST_F(InputFile, MayBeAPipe)
 {
     std::array<int, 2> ends{};
     ASSERT_EQ(pipe(ends.data()), 0);
     ASSERT_EQ(write(ends[1], "through", 7), 7);
     close(ends[1]);
     wdinputfile file("/proc/self/fd/" + std::to_string(ends[0]));
-    EXPECT_EQ(file.size(), 0U);
     EXPECT_EQ(readall(file), "through");
     close(ends[0]);
 }
