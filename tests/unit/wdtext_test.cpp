@@ -105,6 +105,7 @@ TEST(Text, ManyThreadsMayCopyReplaceAndDropItAtOnce)
     const std::vector<wdtext> texts{wdtext("one"), wdtext(kLong)};
     std::vector<wdtext> last(4);
     std::vector<std::thread> threads;
+    threads.reserve(last.size());
     for (wdtext& mine : last) {
         threads.emplace_back([&texts, &mine] {
             for (int i = 0; i < kRounds; ++i) {

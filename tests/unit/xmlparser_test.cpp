@@ -330,8 +330,9 @@ TEST_F(Reader, TokensMayLieAcrossAnyEdge)
     for (std::size_t before = 0; before <= rest.size(); ++before) {
         const std::string filling(kWindow - 3 - before, 't');
         tokens.clear();
-        EXPECT_EQ(read("<a>" + filling + rest), (Tokens{"<a>", filling, "</a>", ">", "<bb>", "c",
-                                                        "</bb>", ">", "</wdtargets>", "END"}))
+        const Tokens found = read(std::string("<a>").append(filling).append(rest));
+        EXPECT_EQ(found, (Tokens{"<a>", filling, "</a>", ">", "<bb>", "c", "</bb>", ">",
+                                 "</wdtargets>", "END"}))
             << before;
     }
 }
