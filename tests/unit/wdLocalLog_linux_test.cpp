@@ -672,19 +672,6 @@ TEST_F(LocalLog, ServicesEndAtTheirSizeLimitAsEver)
     EXPECT_EQ(WTERMSIG(status), SIGXFSZ);
 }
 
-TEST_F(LocalLogDeath, IgnoredSizeLimitStaysIgnored)
-{
-    EXPECT_EXIT(
-        {
-            (void)std::signal(SIGXFSZ, SIG_IGN);
-            wdLocalLog::LogMessage("m", kLevelInfo, "x");
-            struct sigaction action {};
-            sigaction(SIGXFSZ, nullptr, &action);
-            _exit(action.sa_handler == SIG_IGN ? 7 : 8);
-        },
-        ::testing::ExitedWithCode(7), "");
-}
-
 TEST_F(LocalLogDeath, FullStandardErrorDoesNotKeepTheProcessFromEnding)
 {
     FullPipe errors;
