@@ -672,6 +672,21 @@ TEST_F(LocalLog, ServicesEndAtTheirSizeLimitAsEver)
     EXPECT_EQ(WTERMSIG(status), SIGXFSZ);
 }
 
+// In a process of its own, for what is caught is caught with the first line that one writes.
+TEST(SizeLimit, IgnoredByWhoeverStartedTheDaemonStaysIgnored)
+{
+    ::testing::FLAGS_gtest_death_test_style = "threadsafe";
+    EXPECT_EXIT(
+        {
+            (void)std::signal(SIGXFSZ, SIG_IGN);
+            writestandard(STDERR_FILENO, "x");
+            struct sigaction action {};
+            sigaction(SIGXFSZ, nullptr, &action);
+            std::_Exit(action.sa_handler == SIG_IGN ? 7 : 8);
+        },
+        ::testing::ExitedWithCode(7), "");
+}
+
 TEST_F(LocalLogDeath, FullStandardErrorDoesNotKeepTheProcessFromEnding)
 {
     FullPipe errors;
