@@ -163,6 +163,7 @@ pid_of() {
         redis-server) cat /run/redis/redis-server.pid ;;
         nginx) cat /run/nginx.pid ;;
         cron) cat /run/crond.pid ;;
+        php8.2-fpm) cat /run/php/php8.2-fpm.pid ;;
         *) cat "/run/$1.pid" ;;
     esac
 }
