@@ -2,7 +2,7 @@
 # its check of a page fails, and so both are restarted.
 cp /opt/project/config/nginx-php-fpm.xml "$configuration"
 mkdir -p /run/www
-echo '<?php echo "up\n";' >/run/www/up.php
+echo '<?php echo "up";' >/run/www/up.php
 start php8.2-fpm nginx
 until_true curl -fso /dev/null localhost/up.php
 nginx=$(pid_of nginx) php=$(pid_of php8.2-fpm)
