@@ -32,7 +32,7 @@ missing_packages() {
 # Services that the demonstration, the tests and the benchmarks alone need. Where their packages
 # bring them, they are neither started nor enabled at boot; where the machine had them before, they
 # are left as they are.
-readonly borrowed_services=(cron monit nginx redis-server supervisor)
+readonly borrowed_services=(cron monit nginx php8.2-fpm redis-server supervisor)
 readonly guard=/usr/sbin/policy-rc.d
 readonly guard_mark='# made by the setup of tolkwd, for the time of an installation'
 new_services=()
