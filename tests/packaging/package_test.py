@@ -1,0 +1,268 @@
+"""The packages: what is in them, and what they do to a fresh machine that installs them."""
+
+import glob
+import re
+import shutil
+import subprocess
+
+import pytest
+
+CONFIGURATION = "/etc/opt/varden/tolk/tolkwd.xml"
+EXAMPLE = "/etc/opt/varden/tolk/tolkwd.xml.example"
+DEFAULTS = "/etc/default/tolkwd"
+PINGS = "/opt/varden/tolk/bin"
+LOG = "/var/log/tolkwd.log"
+
+# Debian's own documents of a package.
+DEBIAN_ALONE = {"usr/share/doc/tolkwd/copyright", "usr/share/doc/tolkwd/changelog.Debian.gz",
+                "usr/share/lintian/overrides/tolkwd"}
+
+# Twenty of the daemon's seconds pass in one.
+CLOCK = """
+export LD_PRELOAD=$(echo /usr/lib/*/faketime/libfaketimeMT.so.1)
+export FAKETIME="+0 x20" FAKETIME_ONLY_CMDS=tolkwd
+TOLKWD_OPTIONS="-g"
+"""
+
+WATCH_CRON = """<?xml version='1.0'?>
+<wdtargets>
+  <wdmonitortarget>
+    <wdmonitorservice>
+      <name>cron</name>
+      <binarypath>/usr/sbin/cron</binarypath>
+      <startcmd>NULL</startcmd>
+      <stopcmd>NULL</stopcmd>
+      <functionalpingcmd>NULL</functionalpingcmd>
+      <genpinginterval>20</genpinginterval>
+      <funpinginterval>20</funpinginterval>
+      <maxattemptofwakeup>3</maxattemptofwakeup>
+    </wdmonitorservice>
+  </wdmonitortarget>
+</wdtargets>
+"""
+
+
+on_a_machine = pytest.mark.machine
+
+
+def output(*command):
+    return subprocess.run(command, check=True, capture_output=True, text=True).stdout
+
+
+def files_of_deb(package):
+    lines = output("dpkg-deb", "--contents", package).splitlines()
+    return {line.split(" -> ")[0].split(" ./", 1)[1] for line in lines
+            if not line.startswith("d")}
+
+
+def read(machine, *names):
+    return {name: machine.path(name).read_bytes() for name in names}
+
+
+def install_configured(machine, package):
+    """A machine with the package, a configuration of cron, both at work."""
+    shutil.copy(package, machine.path("package.deb"))
+    machine.run("dpkg --install /package.deb")
+    machine.write(CONFIGURATION, WATCH_CRON)
+    machine.write(DEFAULTS, machine.path(DEFAULTS).read_text() + CLOCK)
+    machine.run("service cron start")
+    # The very commands that the installation names.
+    machine.run("update-rc.d tolkwd enable && service tolkwd start")
+    machine.await_line(LOG, "General ping successful!")
+
+
+def cron(machine):
+    return machine.run("cat /run/crond.pid").strip()
+
+
+def daemon(machine):
+    return machine.run("cat /run/tolkwd.pid").strip()
+
+
+def newer(package, folder):
+    """The package, as a later version with another example."""
+    tree = folder / "tree"
+    subprocess.run(["dpkg-deb", "--raw-extract", package, tree], check=True)
+    control = tree / "DEBIAN" / "control"
+    text, count = re.subn(r"^Version: .*$", "Version: 9.0.0-1", control.read_text(), flags=re.M)
+    assert count == 1
+    control.write_text(text)
+    with (tree / EXAMPLE[1:]).open("a") as example:
+        example.write("\n")
+    subprocess.run(["dpkg-deb", "--root-owner-group", "--build", tree, folder / "newer.deb"],
+                   check=True, stdout=subprocess.DEVNULL)
+    return folder / "newer.deb"
+
+
+def test_every_file_has_its_place(packed):
+    files = files_of_deb(packed("DEB"))
+    assert {"opt/varden/tolk/bin/tolkwd", "usr/sbin/tolkwd", EXAMPLE[1:], DEFAULTS[1:],
+            "etc/init.d/tolkwd", "usr/lib/systemd/system/tolkwd.service",
+            "usr/share/man/man8/tolkwd.8.gz", "usr/share/man/man5/tolkwd.xml.5.gz",
+            "usr/share/doc/tolkwd/LICENSE", "usr/share/doc/tolkwd/OPERATING.md",
+            "usr/share/doc/tolkwd/MESSAGES.md"} <= files
+    assert CONFIGURATION[1:] not in files
+
+
+def test_rpm_holds_the_same(packed):
+    rpm = set(output("rpm", "--query", "--list", "--package", packed("RPM"),
+                     "--queryformat", "[%{FILEMODES:perms} %{FILENAMES}\n]").splitlines())
+    files = {line.split(" /", 1)[1] for line in rpm if " " in line and not line.startswith("d")}
+    assert files == files_of_deb(packed("DEB")) - DEBIAN_ALONE
+
+
+def test_rpm_keeps_what_operators_edit(packed):
+    kept = output("rpm", "--query", "--configfiles", "--package", packed("RPM")).split()
+    assert sorted(kept) == sorted([DEFAULTS, "/etc/init.d/tolkwd", EXAMPLE])
+
+
+def test_lintian_has_nothing_to_say(packed):
+    done = subprocess.run(["lintian", "--fail-on", "error,warning", packed("DEB")],
+                          capture_output=True, text=True)
+    assert (done.returncode, done.stdout) == (0, "")
+
+
+def test_the_same_sources_give_the_same_package(build, packed, tmp_path):
+    environment = {"SOURCE_DATE_EPOCH": "1000000000", "PATH": "/usr/sbin:/usr/bin:/sbin:/bin"}
+    contents = []
+    for folder in (tmp_path / "first", tmp_path / "second"):
+        subprocess.run(["cpack", "-G", "DEB", "-B", folder], cwd=build, env=environment,
+                       check=True, stdout=subprocess.DEVNULL)
+        package, = folder.glob("*.deb")
+        contents.append(package.read_bytes())
+    assert contents[0] == contents[1]
+
+
+def test_an_installation_by_hand_overwrites_no_edited_file(build, tmp_path):
+    def install():
+        subprocess.run(["cmake", "--install", build], env={"DESTDIR": str(tmp_path),
+                       "PATH": "/usr/bin:/bin"}, check=True, stdout=subprocess.DEVNULL)
+
+    install()
+    program = tmp_path / "opt/varden/tolk/bin/tolkwd"
+    assert program.stat().st_mode & 0o111 == 0o111
+    assert (tmp_path / "usr/sbin/tolkwd").readlink().as_posix() == "/opt/varden/tolk/bin/tolkwd"
+    edited = tmp_path / EXAMPLE[1:]
+    edited.write_text("edited")
+    install()
+    assert edited.read_text() == "edited"
+
+
+def test_the_unit_is_in_order(build, project, tmp_path):
+    """In a sandbox in which the program is where the unit expects it."""
+    subprocess.run(["cmake", "--install", build], env={"DESTDIR": str(tmp_path),
+                   "PATH": "/usr/bin:/bin"}, check=True, stdout=subprocess.DEVNULL)
+
+    def verify(unit):
+        done = subprocess.run(
+            [project / "scripts/sandbox.sh", "--ro-bind", tmp_path / "opt/varden", "/opt/varden",
+             "--ro-bind", unit, "/run/tolkwd.service", "--",
+             "systemd-analyze", "verify", "--man=no", "/run/tolkwd.service"],
+            stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True)
+        return done.returncode, done.stdout
+
+    unit = tmp_path / "usr/lib/systemd/system/tolkwd.service"
+    assert verify(unit) == (0, "")
+    broken = tmp_path / "broken.service"
+    broken.write_text(unit.read_text().replace("RestartSec=10", "RestartSec=ten"))
+    assert "Failed to parse sec value" in verify(broken)[1]
+
+
+@on_a_machine
+def test_nothing_is_enabled_without_a_configuration(machine, packed):
+    shutil.copy(packed("DEB"), machine.path("package.deb"))
+    said = machine.run("dpkg --install /package.deb")
+    assert "there is no configuration yet" in said
+    assert "tolkwd is not running" in machine.run("service tolkwd status", expect=3)
+    assert not glob.glob(str(machine.path("/etc/rc?.d/S??tolkwd")))
+    assert not machine.exists("/etc/systemd/system/multi-user.target.wants/tolkwd.service")
+    assert "there is no " + CONFIGURATION in machine.run("service tolkwd start", expect=6)
+
+
+@on_a_machine
+def test_a_killed_service_comes_back(machine, packed):
+    install_configured(machine, packed("DEB"))
+    assert "tolkwd is running" in machine.run("service tolkwd status")
+    old = cron(machine)
+    machine.run(f"kill -KILL {old}")
+    machine.await_line(LOG, "this service has been general recoverred successfully.")
+    assert cron(machine) != old
+    assert "is running" in machine.run("service cron status")
+
+
+@on_a_machine
+def test_an_upgrade_keeps_what_was_edited(machine, packed, tmp_path):
+    install_configured(machine, packed("DEB"))
+    machine.write(EXAMPLE, "edited\n")
+    before = read(machine, CONFIGURATION, DEFAULTS, EXAMPLE)
+    watchdog, watched = daemon(machine), cron(machine)
+
+    shutil.copy(newer(packed("DEB"), tmp_path), machine.path("newer.deb"))
+    machine.run("dpkg --force-confdef --install /newer.deb")
+    assert read(machine, CONFIGURATION, DEFAULTS, EXAMPLE) == before
+    assert "tolkwd is running" in machine.run("service tolkwd status")
+    assert daemon(machine) != watchdog
+    assert cron(machine) == watched
+
+
+@on_a_machine
+def test_what_was_disabled_stays_so(machine, packed, tmp_path):
+    install_configured(machine, packed("DEB"))
+    machine.run("service tolkwd stop && update-rc.d tolkwd disable")
+    shutil.copy(newer(packed("DEB"), tmp_path), machine.path("newer.deb"))
+    machine.run("dpkg --install /newer.deb")
+    assert not glob.glob(str(machine.path("/etc/rc2.d/S??tolkwd")))
+
+
+@on_a_machine
+def test_removal_keeps_the_configuration_and_a_new_installation_takes_it_up(machine, packed):
+    install_configured(machine, packed("DEB"))
+    before = read(machine, CONFIGURATION, DEFAULTS, EXAMPLE)
+    watchdog, watched = daemon(machine), cron(machine)
+
+    machine.run("dpkg --remove tolkwd")
+    assert read(machine, CONFIGURATION, DEFAULTS, EXAMPLE) == before
+    assert not machine.exists(PINGS)
+    assert not machine.exists("/usr/sbin/tolkwd")
+    machine.run(f"kill -0 {watchdog}", expect=1)
+    assert cron(machine) == watched
+
+    machine.run("dpkg --install /package.deb")
+    assert "tolkwd is running" in machine.run("service tolkwd status")
+
+
+@on_a_machine
+def test_purging_leaves_nothing(machine, packed):
+    fresh = machine.files()
+    install_configured(machine, packed("DEB"))
+    assert machine.exists(PINGS + "/agent.cron")
+    machine.run("rm /package.deb && dpkg --purge tolkwd")
+    assert machine.files() - fresh == set()
+    # dpkg removes a folder that is empty and no other package's.
+    assert fresh - machine.files() <= {"etc/opt", "opt"}
+
+
+@on_a_machine
+def test_purging_leaves_the_agents_files_alone(machine, packed):
+    install_configured(machine, packed("DEB"))
+    machine.write("/etc/opt/varden/tolk/cimom", "")
+    machine.write(PINGS + "/agent.helper", "#!/bin/sh\n")
+    machine.run(f"chmod 755 {PINGS}/agent.helper && dpkg --purge tolkwd")
+    assert machine.exists("/etc/opt/varden/tolk/cimom")
+    assert machine.exists(PINGS + "/agent.helper")
+    assert not machine.exists(PINGS + "/agent.cron")
+    assert not machine.exists(CONFIGURATION)
+
+
+@on_a_machine
+@pytest.mark.parametrize("cause, said", [
+    (f"echo 'TOLKWD_OPTIONS=\"-t -n\"' >{DEFAULTS}", "'-t' used but no check time specified"),
+    (f"mkdir {LOG}", "Unable to open the log file"),
+])
+def test_a_start_that_fails_says_why(machine, packed, cause, said):
+    shutil.copy(packed("DEB"), machine.path("package.deb"))
+    machine.run("dpkg --install /package.deb")
+    machine.write(CONFIGURATION, WATCH_CRON)
+    machine.run(cause)
+    assert said in machine.run("service tolkwd start", expect=1)
+    assert "tolkwd is not running" in machine.run("service tolkwd status", expect=1)
