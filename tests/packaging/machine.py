@@ -98,6 +98,10 @@ class Machine:
     def exists(self, name):
         return os.path.lexists(self.path(name))
 
+    def put(self, source, name):
+        """Copies a file from outside."""
+        subprocess.run([*AS_ROOT, "cp", source, self.path(name)], check=True)
+
     def write(self, name, text):
         subprocess.run([*AS_ROOT, "tee", self.path(name)], input=text, text=True, check=True,
                        stdout=subprocess.DEVNULL)
@@ -130,17 +134,16 @@ def running(system, folder):
     """A copy of the system in this folder, running."""
     root = folder / "root"
     subprocess.run([*AS_ROOT, "cp", "-a", "--reflink=auto", system, root], check=True)
-    readable, writable = os.pipe()
+    # On standard output bwrap tells the process id, and then closes it; sudo passes on no other
+    # descriptor than these three.
     sandbox = subprocess.Popen(
         [*AS_ROOT, "bwrap", "--bind", root, "/", "--dev", "/dev", "--proc", "/proc",
          "--tmpfs", "/run", "--tmpfs", "/tmp", "--unshare-pid", "--unshare-net", "--unshare-ipc",
-         "--unshare-uts", "--die-with-parent", "--cap-add", "ALL", "--info-fd", str(writable), "--",
-         "sh", "-c", "echo ready; exec sleep infinity"],
-        pass_fds=[writable], stdin=subprocess.DEVNULL, stdout=subprocess.PIPE)
-    os.close(writable)
-    with os.fdopen(readable) as stream:
-        process = json.load(stream)["child-pid"]
-    assert sandbox.stdout.readline() == b"ready\n"
+         "--unshare-uts", "--die-with-parent", "--cap-add", "ALL", "--info-fd", "1", "--",
+         "sh", "-c", "echo ready >&2; exec sleep infinity"],
+        stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.PIPE, text=True)
+    process = json.load(sandbox.stdout)["child-pid"]
+    assert sandbox.stderr.readline() == "ready\n"
     try:
         machine = Machine(root, process)
         machine.run("cat >/run/utmp", given=BOOTED)

@@ -2,7 +2,6 @@
 
 import glob
 import re
-import shutil
 import subprocess
 
 import pytest
@@ -61,7 +60,7 @@ def read(machine, *names):
 
 def install_configured(machine, package):
     """A machine with the package, a configuration of cron, both at work."""
-    shutil.copy(package, machine.path("package.deb"))
+    machine.put(package, "package.deb")
     machine.run("dpkg --install /package.deb")
     machine.write(CONFIGURATION, WATCH_CRON)
     machine.write(DEFAULTS, machine.path(DEFAULTS).read_text() + CLOCK)
@@ -170,7 +169,7 @@ def test_the_unit_is_in_order(build, project, tmp_path):
 
 @on_a_machine
 def test_nothing_is_enabled_without_a_configuration(machine, packed):
-    shutil.copy(packed("DEB"), machine.path("package.deb"))
+    machine.put(packed("DEB"), "package.deb")
     said = machine.run("dpkg --install /package.deb")
     assert "there is no configuration yet" in said
     assert "tolkwd is not running" in machine.run("service tolkwd status", expect=3)
@@ -197,7 +196,7 @@ def test_an_upgrade_keeps_what_was_edited(machine, packed, tmp_path):
     before = read(machine, CONFIGURATION, DEFAULTS, EXAMPLE)
     watchdog, watched = daemon(machine), cron(machine)
 
-    shutil.copy(newer(packed("DEB"), tmp_path), machine.path("newer.deb"))
+    machine.put(newer(packed("DEB"), tmp_path), "newer.deb")
     machine.run("dpkg --force-confdef --install /newer.deb")
     assert read(machine, CONFIGURATION, DEFAULTS, EXAMPLE) == before
     assert "tolkwd is running" in machine.run("service tolkwd status")
@@ -209,7 +208,7 @@ def test_an_upgrade_keeps_what_was_edited(machine, packed, tmp_path):
 def test_what_was_disabled_stays_so(machine, packed, tmp_path):
     install_configured(machine, packed("DEB"))
     machine.run("service tolkwd stop && update-rc.d tolkwd disable")
-    shutil.copy(newer(packed("DEB"), tmp_path), machine.path("newer.deb"))
+    machine.put(newer(packed("DEB"), tmp_path), "newer.deb")
     machine.run("dpkg --install /newer.deb")
     assert not glob.glob(str(machine.path("/etc/rc2.d/S??tolkwd")))
 
@@ -260,7 +259,7 @@ def test_purging_leaves_the_agents_files_alone(machine, packed):
     (f"mkdir {LOG}", "Unable to open the log file"),
 ])
 def test_a_start_that_fails_says_why(machine, packed, cause, said):
-    shutil.copy(packed("DEB"), machine.path("package.deb"))
+    machine.put(packed("DEB"), "package.deb")
     machine.run("dpkg --install /package.deb")
     machine.write(CONFIGURATION, WATCH_CRON)
     machine.run(cause)
