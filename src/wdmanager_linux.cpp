@@ -101,8 +101,8 @@ void wdmanager::startgeneration()
     }
 }
 
-// Each thread ends at the top of its next cycle; until then its intervals, retries and a recovery
-// may pass.
+// Each thread ends at the top of its next cycle; until then all the retries and recoveries of an
+// outage may pass.
 void wdmanager::stopgeneration()
 {
     enablemonitoring(false);

@@ -9,10 +9,10 @@
 // After maxattemptofwakeup recoveries without a good ping the thread gives up and ends; the
 // manager's next refresh starts a fresh one.
 //
-// The end. A thread looks at `globalenable` at the top of each cycle only; from there to the next
-// top there can be a whole interval, the retries and a recovery. It also ends, through
-// pthread_exit, when the status command does not know the service or when it gives up. Nothing on
-// that road may be noexcept or catch everything: pthread_exit unwinds the stack.
+// The end. A thread looks at `globalenable` at the top of each cycle only, and a cycle lasts until
+// the service runs or is given up: intervals, retries and all the recoveries it may have. It also
+// ends, through pthread_exit, when the status command does not know the service or when it gives
+// up. Nothing on that road may be noexcept or catch everything: pthread_exit unwinds the stack.
 //
 // The lock. Pings hold `pingreclock` for reading while their command runs, a recovery holds it for
 // writing from its first command to its last: no ping runs anywhere while a recovery is under way.
