@@ -18,6 +18,7 @@ set(CPACK_STRIP_FILES ON)
 set(CPACK_SET_DESTDIR ON)
 set(CPACK_PACKAGE_RELOCATABLE OFF)
 set(CPACK_INSTALL_PREFIX /usr)
+set(CPACK_PRE_BUILD_SCRIPTS ${CMAKE_CURRENT_SOURCE_DIR}/folders.cmake)
 set(CPACK_PROJECT_CONFIG_FILE ${CMAKE_CURRENT_SOURCE_DIR}/kinds.cmake)
 
 set(debian ${CMAKE_CURRENT_SOURCE_DIR}/debian)
@@ -49,6 +50,9 @@ configure_file(${debian}/changelog.in changelog.Debian @ONLY)
 
 set(rpm ${CMAKE_CURRENT_SOURCE_DIR}/rpm)
 set(CPACK_RPM_FILE_NAME RPM-DEFAULT)
+set(CPACK_RPM_PACKAGE_DESCRIPTION "${CPACK_PACKAGE_DESCRIPTION}")
+# Without it every ping would fail.
+set(CPACK_RPM_PACKAGE_REQUIRES /usr/sbin/service)
 set(CPACK_RPM_PACKAGE_RELEASE 1)
 configure_file(${rpm}/changelog.in changelog.rpm @ONLY)
 set(CPACK_RPM_CHANGELOG_FILE ${CMAKE_CURRENT_BINARY_DIR}/changelog.rpm)

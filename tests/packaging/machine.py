@@ -18,6 +18,7 @@ import time
 # System V, service and update-rc.d use init scripts.
 PACKAGES = "cron,libfaketime,sysvinit-core"
 LIMIT_SECONDS = 900
+COMMAND_LIMIT_SECONDS = 120
 
 # These change whenever dpkg runs, or belong to what runs, or are what services leave behind.
 UNSTEADY = ("dev", "proc", "run", "sys", "tmp", "var/cache", "var/lib/dpkg", "var/log/dpkg.log",
@@ -27,7 +28,9 @@ UNSTEADY = ("dev", "proc", "run", "sys", "tmp", "var/cache", "var/lib/dpkg", "va
 # only where that is known. The type RUN_LVL, and both levels as a process id.
 BOOTED = struct.pack("=hxxi376x", 1, ord("2") + 256 * ord("N"))
 
-AS_ROOT = [] if os.geteuid() == 0 else ["sudo"]
+AS_ROOT = [] if os.geteuid() == 0 else ["sudo", "--non-interactive"]
+SEPARATE = ["--unshare-pid", "--unshare-net", "--unshare-ipc", "--unshare-uts", "--die-with-parent",
+            "--cap-add", "ALL"]
 
 
 class Impossible(Exception):
@@ -51,6 +54,13 @@ def mirror():
 
 def minimal_system(cache):
     """The folder of the system; made now unless it is there from an earlier run."""
+    missing = programs_missing()
+    if missing:
+        raise Impossible(f"{', '.join(missing)} missing")
+    tried = subprocess.run([*AS_ROOT, "bwrap", *SEPARATE, "--bind", "/", "/", "true"],
+                           stdin=subprocess.DEVNULL, capture_output=True, text=True)
+    if tried.returncode != 0:
+        raise Impossible(f"no sandbox: {tried.stderr.strip()}")
     codename, source = mirror()
     system = cache / f"{codename}-{PACKAGES.replace(',', '-')}"
     if system.is_dir():
@@ -58,10 +68,13 @@ def minimal_system(cache):
     unfinished = system.with_suffix(".unfinished")
     subprocess.run([*AS_ROOT, "rm", "-rf", unfinished], check=True)
     cache.mkdir(parents=True, exist_ok=True)
-    made = subprocess.run(
-        [*AS_ROOT, "debootstrap", "--variant=minbase", f"--include={PACKAGES}", codename,
-         unfinished, source],
-        stdin=subprocess.DEVNULL, capture_output=True, text=True, timeout=LIMIT_SECONDS)
+    try:
+        made = subprocess.run(
+            [*AS_ROOT, "debootstrap", "--variant=minbase", f"--include={PACKAGES}", codename,
+             unfinished, source],
+            stdin=subprocess.DEVNULL, capture_output=True, text=True, timeout=LIMIT_SECONDS)
+    except subprocess.TimeoutExpired as late:
+        raise Impossible(f"debootstrap took more than {LIMIT_SECONDS} s") from late
     if made.returncode != 0:
         raise Impossible("debootstrap failed:\n" + "\n".join(made.stdout.splitlines()[-5:]))
     # What no test needs, and every copy would take along.
@@ -86,7 +99,8 @@ class Machine:
              "--ipc", "--uts", "--root", "env", "-i", "--chdir=/",
              "PATH=/usr/local/sbin:/usr/local/bin:/usr/sbin:/usr/bin:/sbin:/bin",
              "DEBIAN_FRONTEND=noninteractive", "sh", "-c", command],
-            input=given, stdout=subprocess.PIPE, stderr=subprocess.STDOUT, timeout=LIMIT_SECONDS)
+            input=given, stdout=subprocess.PIPE, stderr=subprocess.STDOUT,
+            timeout=COMMAND_LIMIT_SECONDS)
         said = done.stdout.decode(errors="replace")
         assert done.returncode == expect, f"{command}: status {done.returncode}\n{said}"
         return said
@@ -133,30 +147,38 @@ class Machine:
 def running(system, folder):
     """A copy of the system in this folder, running."""
     root = folder / "root"
-    subprocess.run([*AS_ROOT, "cp", "-a", "--reflink=auto", system, root], check=True)
+    try:
+        subprocess.run([*AS_ROOT, "cp", "-a", "--reflink=auto", system, root], check=True)
+        with sandbox(root) as process:
+            machine = Machine(root, process)
+            machine.run("cat >/run/utmp", given=BOOTED)
+            yield machine
+    finally:
+        subprocess.run([*AS_ROOT, "rm", "-rf", root], check=True)
+
+
+@contextlib.contextmanager
+def sandbox(root):
+    """A sandbox around this root folder, in which nothing happens yet: its first process."""
     # On standard output bwrap tells the process id, and then closes it; sudo passes on no other
     # descriptor than these three.
-    sandbox = subprocess.Popen(
-        [*AS_ROOT, "bwrap", "--bind", root, "/", "--dev", "/dev", "--proc", "/proc",
-         "--tmpfs", "/run", "--tmpfs", "/tmp", "--unshare-pid", "--unshare-net", "--unshare-ipc",
-         "--unshare-uts", "--die-with-parent", "--cap-add", "ALL", "--info-fd", "1", "--",
+    outside = subprocess.Popen(
+        [*AS_ROOT, "bwrap", *SEPARATE, "--bind", root, "/", "--dev", "/dev", "--proc", "/proc",
+         "--tmpfs", "/run", "--tmpfs", "/tmp", "--info-fd", "1", "--",
          "sh", "-c", "echo ready >&2; exec sleep infinity"],
         stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.PIPE, text=True)
-    process = json.load(sandbox.stdout)["child-pid"]
-    assert sandbox.stderr.readline() == "ready\n"
+    process = json.load(outside.stdout)["child-pid"]
     try:
-        machine = Machine(root, process)
-        machine.run("cat >/run/utmp", given=BOOTED)
-        yield machine
+        assert outside.stderr.readline() == "ready\n"
+        yield process
     finally:
         # The first process of its name space: what runs in it ends with it.
         subprocess.run([*AS_ROOT, "kill", "-KILL", str(process)], check=True)
-        sandbox.wait()
-        subprocess.run([*AS_ROOT, "rm", "-rf", root], check=True)
+        outside.wait()
 
 
 def programs_missing():
     """What cannot be done without, and is not there."""
     path = os.environ["PATH"] + ":/usr/sbin:/sbin"
-    needed = ("debootstrap", "bwrap", "nsenter")
+    needed = ["debootstrap", "bwrap", "nsenter", *AS_ROOT[:1]]
     return [name for name in needed if not shutil.which(name, path=path)]

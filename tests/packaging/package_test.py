@@ -1,6 +1,7 @@
 """The packages: what is in them, and what they do to a fresh machine that installs them."""
 
 import glob
+import os
 import re
 import subprocess
 
@@ -78,6 +79,28 @@ def daemon(machine):
     return machine.run("cat /run/tolkwd.pid").strip()
 
 
+def enabled(machine):
+    """The links by which init starts the watchdog, of either kind."""
+    links = glob.glob(str(machine.path("/etc/rc?.d/S??tolkwd")))
+    links += glob.glob(str(machine.path("/etc/systemd/system/*/tolkwd.service")))
+    return sorted(links)
+
+
+def foreign_package(folder):
+    """A package of the management agent's: a file in each of its folders."""
+    tree = folder / "agentx"
+    for name in ("opt/varden/tolk/bin/agent.conf", "etc/opt/varden/tolk/cimom"):
+        (tree / name).parent.mkdir(parents=True)
+        (tree / name).write_text("")
+    (tree / "DEBIAN").mkdir()
+    (tree / "DEBIAN" / "control").write_text(
+        "Package: agentx\nVersion: 1\nArchitecture: all\nMaintainer: somebody\n"
+        "Description: another package of the same folders\n")
+    subprocess.run(["dpkg-deb", "--root-owner-group", "--build", tree, folder / "agentx.deb"],
+                   check=True, stdout=subprocess.DEVNULL)
+    return folder / "agentx.deb"
+
+
 def newer(package, folder):
     """The package, as a later version with another example."""
     tree = folder / "tree"
@@ -122,6 +145,10 @@ def test_lintian_has_nothing_to_say(packed):
 
 
 def test_the_same_sources_give_the_same_package(build, packed, tmp_path):
+    # Not even their compressed files know when they were made, or of what file.
+    for name in glob.glob(str(build / "packaging/*.gz")):
+        with open(name, "rb") as file:
+            assert file.read(8)[3:] == bytes(5), name
     environment = {"SOURCE_DATE_EPOCH": "1000000000", "PATH": "/usr/sbin:/usr/bin:/sbin:/bin"}
     contents = []
     for folder in (tmp_path / "first", tmp_path / "second"):
@@ -130,6 +157,29 @@ def test_the_same_sources_give_the_same_package(build, packed, tmp_path):
         package, = folder.glob("*.deb")
         contents.append(package.read_bytes())
     assert contents[0] == contents[1]
+
+
+@pytest.mark.parametrize("kind, list_files", [("DEB", ["dpkg-deb", "--contents"]),
+                                              ("RPM", ["rpm", "-qlvp"])])
+def test_folders_can_be_read_whoever_makes_the_package(build, tmp_path, kind, list_files):
+    subprocess.run(["cpack", "-G", kind, "-B", tmp_path], cwd=build, umask=0o077, check=True,
+                   stdout=subprocess.DEVNULL)
+    package, = tmp_path.glob(f"*.{kind.lower()}")
+    folders = [line for line in output(*list_files, package).splitlines() if line[0] == "d"]
+    assert folders
+    assert [line for line in folders if not line.startswith("drwxr-xr-x")] == []
+
+
+def test_rpm_says_what_it_is_and_needs(packed):
+    described = output("rpm", "-qp", "--queryformat", "%{DESCRIPTION}", packed("RPM"))
+    assert described.startswith("tolkwd asks the service command")
+    assert "/usr/sbin/service" in output("rpm", "-qp", "--requires", packed("RPM")).split()
+
+
+def test_rpm_has_its_scripts(packed, project):
+    scripts = output("rpm", "-qp", "--scripts", packed("RPM"))
+    for name in ("post", "preun", "postun"):
+        assert (project / "packaging/rpm" / name).read_text() in scripts
 
 
 def test_an_installation_by_hand_overwrites_no_edited_file(build, tmp_path):
@@ -161,6 +211,13 @@ def test_the_unit_is_in_order(build, project, tmp_path):
         return done.returncode, done.stdout
 
     unit = tmp_path / "usr/lib/systemd/system/tolkwd.service"
+    # What operators rely on.
+    assert {"ConditionPathExists=" + CONFIGURATION, "After=local-fs.target", "Restart=always",
+            "RestartSec=10", "RestartPreventExitStatus=2", "StartLimitIntervalSec=0",
+            "IgnoreSIGPIPE=yes", "KillMode=process", "OOMPolicy=continue", "TasksMax=infinity",
+            "StandardOutput=journal", "StandardError=journal", "LogRateLimitIntervalSec=0",
+            "Environment=LC_MESSAGES=C", "EnvironmentFile=-" + DEFAULTS,
+            "WantedBy=multi-user.target"} <= set(unit.read_text().splitlines())
     assert verify(unit) == (0, "")
     broken = tmp_path / "broken.service"
     broken.write_text(unit.read_text().replace("RestartSec=10", "RestartSec=ten"))
@@ -173,8 +230,7 @@ def test_nothing_is_enabled_without_a_configuration(machine, packed):
     said = machine.run("dpkg --install /package.deb")
     assert "there is no configuration yet" in said
     assert "tolkwd is not running" in machine.run("service tolkwd status", expect=3)
-    assert not glob.glob(str(machine.path("/etc/rc?.d/S??tolkwd")))
-    assert not machine.exists("/etc/systemd/system/multi-user.target.wants/tolkwd.service")
+    assert enabled(machine) == []
     assert "there is no " + CONFIGURATION in machine.run("service tolkwd start", expect=6)
 
 
@@ -207,10 +263,35 @@ def test_an_upgrade_keeps_what_was_edited(machine, packed, tmp_path):
 @on_a_machine
 def test_what_was_disabled_stays_so(machine, packed, tmp_path):
     install_configured(machine, packed("DEB"))
+    assert enabled(machine) != []
     machine.run("service tolkwd stop && update-rc.d tolkwd disable")
+    machine.run("rm -f /etc/systemd/system/*/tolkwd.service")
     machine.put(newer(packed("DEB"), tmp_path), "newer.deb")
     machine.run("dpkg --install /newer.deb")
-    assert not glob.glob(str(machine.path("/etc/rc2.d/S??tolkwd")))
+    assert enabled(machine) == []
+    assert "tolkwd is not running" in machine.run("service tolkwd status", expect=3)
+
+
+@on_a_machine
+def test_what_was_stopped_for_the_time_of_an_upgrade_stays_so(machine, packed, tmp_path):
+    install_configured(machine, packed("DEB"))
+    machine.run("service tolkwd stop")
+    machine.put(newer(packed("DEB"), tmp_path), "newer.deb")
+    machine.run("dpkg --install /newer.deb")
+    assert "tolkwd is not running" in machine.run("service tolkwd status", expect=3)
+    assert enabled(machine) != []
+    machine.run("service tolkwd start && dpkg --install /newer.deb")
+    assert "tolkwd is running" in machine.run("service tolkwd status")
+
+
+@on_a_machine
+def test_an_init_script_that_was_removed_stays_so(machine, packed, tmp_path):
+    install_configured(machine, packed("DEB"))
+    machine.run("service tolkwd stop && rm /etc/init.d/tolkwd")
+    machine.put(newer(packed("DEB"), tmp_path), "newer.deb")
+    machine.run("dpkg --install /newer.deb")
+    assert not machine.exists("/etc/init.d/tolkwd")
+    machine.run("dpkg --remove tolkwd && dpkg --purge tolkwd")
 
 
 @on_a_machine
@@ -225,6 +306,8 @@ def test_removal_keeps_the_configuration_and_a_new_installation_takes_it_up(mach
     assert not machine.exists("/usr/sbin/tolkwd")
     machine.run(f"kill -0 {watchdog}", expect=1)
     assert cron(machine) == watched
+    # Or systemd would go on knowing the unit.
+    assert os.readlink(machine.path("/etc/systemd/system/tolkwd.service")) == "/dev/null"
 
     machine.run("dpkg --install /package.deb")
     assert "tolkwd is running" in machine.run("service tolkwd status")
@@ -242,19 +325,68 @@ def test_purging_leaves_nothing(machine, packed):
 
 
 @on_a_machine
-def test_purging_leaves_the_agents_files_alone(machine, packed):
+def test_purging_leaves_the_agents_files_alone(machine, packed, tmp_path):
     install_configured(machine, packed("DEB"))
-    machine.write("/etc/opt/varden/tolk/cimom", "")
+    machine.put(foreign_package(tmp_path), "agentx.deb")
+    machine.run("dpkg --install /agentx.deb")
     machine.write(PINGS + "/agent.helper", "#!/bin/sh\n")
     machine.run(f"chmod 755 {PINGS}/agent.helper && dpkg --purge tolkwd")
-    assert machine.exists("/etc/opt/varden/tolk/cimom")
+    assert machine.run("dpkg --verify agentx") == ""
     assert machine.exists(PINGS + "/agent.helper")
     assert not machine.exists(PINGS + "/agent.cron")
     assert not machine.exists(CONFIGURATION)
 
 
 @on_a_machine
+def test_purging_is_not_stopped_by_what_operators_do(machine, packed):
+    install_configured(machine, packed("DEB"))
+    machine.run(f"service tolkwd stop && rm {LOG} && mkdir {LOG} && mkdir /data"
+                " && mv /etc/opt/varden/tolk /data && ln -s /data/tolk /etc/opt/varden/tolk")
+    machine.run("dpkg --purge tolkwd")
+    assert machine.run("dpkg-query --list tolkwd | tail -n 1 | cut -c1-2").strip() != "pc"
+
+
+@on_a_machine
+def test_the_rpms_scripts_do_their_work(machine, packed, project):
+    """On the files of the Debian package, which are the same."""
+    install_configured(machine, packed("DEB"))
+    for name in ("post", "preun", "postun"):
+        machine.put(project / "packaging/rpm" / name, name)
+    watchdog = daemon(machine)
+    machine.run("sh /post 1; sh /preun 1")
+    assert daemon(machine) == watchdog
+    machine.run("sh /postun 1")
+    assert daemon(machine) != watchdog
+    assert machine.exists(PINGS + "/agent.cron")
+    machine.run("sh /preun 0; sh /postun 0")
+    assert "tolkwd is not running" in machine.run("service tolkwd status", expect=3)
+    assert not machine.exists(PINGS + "/agent.cron")
+
+
+@on_a_machine
+def test_another_process_with_its_number_is_no_watchdog(machine, packed):
+    install_configured(machine, packed("DEB"))
+    machine.run("service tolkwd stop; sleep 1000 >/dev/null 2>&1 & echo $! >/run/tolkwd.pid")
+    assert "tolkwd is not running" in machine.run("service tolkwd status", expect=1)
+    # Nor is the init script itself, whose name is the same.
+    machine.run("echo $$ >/run/tolkwd.pid; exec /etc/init.d/tolkwd start")
+    assert "tolkwd is running" in machine.run("service tolkwd status")
+
+
+@on_a_machine
+def test_standard_output_goes_where_the_operator_says(machine, packed):
+    install_configured(machine, packed("DEB"))
+    options = machine.path(DEFAULTS).read_text()
+    machine.write(DEFAULTS, options + "TOLKWD_OUTPUT=/var/log/tolkwd.out\n")
+    machine.run(f"service tolkwd stop; rm {LOG}; service tolkwd start")
+    machine.await_line(LOG, "General ping successful!")
+    machine.run("service tolkwd stop")
+    assert read(machine, LOG)[LOG] == machine.path("/var/log/tolkwd.out").read_bytes()
+
+
+@on_a_machine
 @pytest.mark.parametrize("cause, said", [
+    (f"echo TOLKWD_OUTPUT=/nowhere/out >{DEFAULTS}", "/nowhere/out"),
     (f"echo 'TOLKWD_OPTIONS=\"-t -n\"' >{DEFAULTS}", "'-t' used but no check time specified"),
     (f"mkdir {LOG}", "Unable to open the log file"),
 ])
@@ -262,6 +394,9 @@ def test_a_start_that_fails_says_why(machine, packed, cause, said):
     machine.put(packed("DEB"), "package.deb")
     machine.run("dpkg --install /package.deb")
     machine.write(CONFIGURATION, WATCH_CRON)
+    machine.write("/var/log/tolkwd.err", "of last week\n")
     machine.run(cause)
-    assert said in machine.run("service tolkwd start", expect=1)
+    answer = machine.run("service tolkwd start", expect=1)
+    assert said in answer
+    assert "of last week" not in answer
     assert "tolkwd is not running" in machine.run("service tolkwd status", expect=1)
