@@ -238,6 +238,7 @@ def test_nothing_is_enabled_without_a_configuration(machine, packed):
 def test_a_killed_service_comes_back(machine, packed):
     install_configured(machine, packed("DEB"))
     assert "tolkwd is running" in machine.run("service tolkwd status")
+    assert "tolkwd is running" in machine.run("setpriv --reuid nobody service tolkwd status")
     old = cron(machine)
     machine.run(f"kill -KILL {old}")
     machine.await_line(LOG, "this service has been general recoverred successfully.")
