@@ -238,7 +238,9 @@ def test_nothing_is_enabled_without_a_configuration(machine, packed):
 def test_a_killed_service_comes_back(machine, packed):
     install_configured(machine, packed("DEB"))
     assert "tolkwd is running" in machine.run("service tolkwd status")
-    assert "tolkwd is running" in machine.run("setpriv --reuid nobody service tolkwd status")
+    by_nobody = "setpriv --reuid nobody --clear-groups service tolkwd "
+    assert "tolkwd is running" in machine.run(by_nobody + "status")
+    assert "only root may do this" in machine.run(by_nobody + "stop", expect=4)
     old = cron(machine)
     machine.run(f"kill -KILL {old}")
     machine.await_line(LOG, "this service has been general recoverred successfully.")
@@ -283,6 +285,42 @@ def test_what_was_stopped_for_the_time_of_an_upgrade_stays_so(machine, packed, t
     assert enabled(machine) != []
     machine.run("service tolkwd start && dpkg --install /newer.deb")
     assert "tolkwd is running" in machine.run("service tolkwd status")
+
+
+@on_a_machine
+def test_an_upgrade_without_a_configuration_stops_no_later_one(machine, packed, tmp_path):
+    machine.put(packed("DEB"), "package.deb")
+    machine.put(newer(packed("DEB"), tmp_path), "newer.deb")
+    machine.run("dpkg --install /package.deb && dpkg --install /newer.deb")
+    install_configured(machine, packed("DEB"))
+    watchdog = daemon(machine)
+    machine.run("dpkg --install /newer.deb")
+    assert daemon(machine) != watchdog
+    machine.run(f"kill -KILL {daemon(machine)}; sleep 0.5; dpkg --install /newer.deb")
+    assert "tolkwd is running" in machine.run("service tolkwd status")
+
+
+@on_a_machine
+def test_a_removal_that_may_not_stop_it_leaves_it_its_folder(machine, packed):
+    install_configured(machine, packed("DEB"))
+    watchdog, watched = daemon(machine), cron(machine)
+    machine.write("/usr/sbin/policy-rc.d", "#!/bin/sh\nexit 101\n")
+    said = machine.run("chmod 755 /usr/sbin/policy-rc.d && dpkg --remove tolkwd")
+    assert "it still runs" in said
+    assert machine.exists(PINGS + "/agent.cron")
+    machine.run(f"kill -0 {watchdog}; : >{LOG}")
+    machine.await_line(LOG, "General ping successful!")
+    assert cron(machine) == watched
+
+
+@on_a_machine
+def test_it_may_be_installed_behind_a_link(machine, packed):
+    machine.run("mkdir -p /data /opt && rmdir /opt && ln -s /data /opt")
+    install_configured(machine, packed("DEB"))
+    assert "tolkwd is running" in machine.run("service tolkwd status")
+    machine.run("dpkg --remove tolkwd")
+    assert "tolkwd is not running" in machine.run("service tolkwd status", expect=3)
+    assert not machine.exists("/data/varden/tolk/bin/agent.cron")
 
 
 @on_a_machine
