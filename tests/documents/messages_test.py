@@ -101,6 +101,13 @@ def test_blanks_are_shown():
 
 
 @pytest.fixture
+def in_agreement():
+    """What a change alone leads to is only seen where the two agree; one failure says enough."""
+    if difference(SOURCES, DOCUMENT):
+        pytest.skip("the document does not list the messages of the sources")
+
+
+@pytest.fixture
 def sources(tmp_path):
     """A copy of the sources; changed(FILE, OLD, NEW) replaces a text that is there once."""
     folder = tmp_path / "src"
@@ -160,6 +167,7 @@ EXTRA = "not in the sources"
                  id="standard error"),
     pytest.param(PINGS, BESIDE, "//" + BESIDE, [EXTRA], id="a message commented out"),
 ])
+@pytest.mark.usefixtures("in_agreement")
 def test_a_change_of_the_sources_is_noticed(sources, name, old, new, expected):
     found = difference(sources(name, old, new), DOCUMENT)
     assert len(found) == len(expected)
@@ -221,6 +229,7 @@ def test_other_places_are_watched_too(sources, name, old, new, why):
     assert why in str(refusal.value)
 
 
+@pytest.mark.usefixtures("in_agreement")
 def test_a_new_file_is_read(sources):
     folder = sources(PINGS, BESIDE, BESIDE)
     (folder / "new.cpp").write_text('void f() { wdlog("new", kLevelError, "a"); }\n')
@@ -242,6 +251,7 @@ ENTRY = "`ERROR wdmanager Loadservices error.`"
     ("wdxmlparserhandler␠ maxattempt ", "wdxmlparserhandler maxattempt ", [MISSING, EXTRA]),
     ("NULL␠`", "NULL`", [MISSING, EXTRA]),
 ])
+@pytest.mark.usefixtures("in_agreement")
 def test_a_change_of_the_document_is_noticed(old, new, expected):
     assert DOCUMENT.count(old) == 1
     found = difference(SOURCES, DOCUMENT.replace(old, new))
