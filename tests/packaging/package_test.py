@@ -116,6 +116,12 @@ def newer(package, folder):
     return folder / "newer.deb"
 
 
+def upgrade(machine, packed, folder):
+    """To a version whose example is another; what an operator has edited is kept."""
+    machine.put(newer(packed("DEB"), folder), "newer.deb")
+    machine.run("dpkg --force-confdef --install /newer.deb")
+
+
 def test_every_file_has_its_place(packed):
     files = files_of_deb(packed("DEB"))
     assert {"opt/varden/tolk/bin/tolkwd", "usr/sbin/tolkwd", EXAMPLE[1:], DEFAULTS[1:],
@@ -255,8 +261,7 @@ def test_an_upgrade_keeps_what_was_edited(machine, packed, tmp_path):
     before = read(machine, CONFIGURATION, DEFAULTS, EXAMPLE)
     watchdog, watched = daemon(machine), cron(machine)
 
-    machine.put(newer(packed("DEB"), tmp_path), "newer.deb")
-    machine.run("dpkg --force-confdef --install /newer.deb")
+    upgrade(machine, packed, tmp_path)
     assert read(machine, CONFIGURATION, DEFAULTS, EXAMPLE) == before
     assert "tolkwd is running" in machine.run("service tolkwd status")
     assert daemon(machine) != watchdog
@@ -269,8 +274,7 @@ def test_what_was_disabled_stays_so(machine, packed, tmp_path):
     assert enabled(machine) != []
     machine.run("service tolkwd stop && update-rc.d tolkwd disable")
     machine.run("rm -f /etc/systemd/system/*/tolkwd.service")
-    machine.put(newer(packed("DEB"), tmp_path), "newer.deb")
-    machine.run("dpkg --install /newer.deb")
+    upgrade(machine, packed, tmp_path)
     assert enabled(machine) == []
     assert "tolkwd is not running" in machine.run("service tolkwd status", expect=3)
 
@@ -279,8 +283,7 @@ def test_what_was_disabled_stays_so(machine, packed, tmp_path):
 def test_what_was_stopped_for_the_time_of_an_upgrade_stays_so(machine, packed, tmp_path):
     install_configured(machine, packed("DEB"))
     machine.run("service tolkwd stop")
-    machine.put(newer(packed("DEB"), tmp_path), "newer.deb")
-    machine.run("dpkg --install /newer.deb")
+    upgrade(machine, packed, tmp_path)
     assert "tolkwd is not running" in machine.run("service tolkwd status", expect=3)
     assert enabled(machine) != []
     machine.run("service tolkwd start && dpkg --install /newer.deb")
@@ -327,8 +330,7 @@ def test_it_may_be_installed_behind_a_link(machine, packed):
 def test_an_init_script_that_was_removed_stays_so(machine, packed, tmp_path):
     install_configured(machine, packed("DEB"))
     machine.run("service tolkwd stop && rm /etc/init.d/tolkwd")
-    machine.put(newer(packed("DEB"), tmp_path), "newer.deb")
-    machine.run("dpkg --install /newer.deb")
+    upgrade(machine, packed, tmp_path)
     assert not machine.exists("/etc/init.d/tolkwd")
     machine.run("dpkg --remove tolkwd && dpkg --purge tolkwd")
 
