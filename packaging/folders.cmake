@@ -1,5 +1,5 @@
-# Run by cpack before it packs: the folders of a package are readable, whatever the umask of who makes
-# it.
+# Run by cpack before it packs: the folders of a package are readable, whatever the umask of who
+# makes it.
 file(GLOB_RECURSE found LIST_DIRECTORIES true ${CPACK_TEMPORARY_DIRECTORY}/*)
 foreach(path IN LISTS found)
   if(IS_DIRECTORY ${path} AND NOT IS_SYMLINK ${path})

@@ -3,7 +3,8 @@ set(CPACK_PACKAGE_NAME tolkwd)
 set(CPACK_PACKAGE_VERSION ${PROJECT_VERSION})
 set(CPACK_PACKAGE_CONTACT "The tolkwd maintainers <maintainers@tolkwd.example>")
 set(CPACK_PACKAGE_VENDOR "The tolkwd maintainers")
-set(CPACK_PACKAGE_DESCRIPTION_SUMMARY "service watchdog that restarts services with their dependents")
+set(CPACK_PACKAGE_DESCRIPTION_SUMMARY
+  "service watchdog that restarts services with their dependents")
 set(CPACK_PACKAGE_DESCRIPTION
 "tolkwd asks the service command whether each configured service runs, and a
 command of the operator's whether it works. A service that keeps failing is

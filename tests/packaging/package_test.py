@@ -152,7 +152,9 @@ def test_lintian_has_nothing_to_say(packed):
 
 def test_the_same_sources_give_the_same_package(build, packed, tmp_path):
     # Not even their compressed files know when they were made, or of what file.
-    for name in glob.glob(str(build / "packaging/*.gz")):
+    compressed = glob.glob(str(build / "packaging/*.gz"))
+    assert compressed
+    for name in compressed:
         with open(name, "rb") as file:
             assert file.read(8)[3:] == bytes(5), name
     environment = {"SOURCE_DATE_EPOCH": "1000000000", "PATH": "/usr/sbin:/usr/bin:/sbin:/bin"}
@@ -222,7 +224,8 @@ def test_the_unit_is_in_order(build, project, tmp_path):
             "RestartSec=10", "RestartPreventExitStatus=2", "StartLimitIntervalSec=0",
             "IgnoreSIGPIPE=yes", "KillMode=process", "OOMPolicy=continue", "TasksMax=infinity",
             "StandardOutput=journal", "StandardError=journal", "LogRateLimitIntervalSec=0",
-            "Environment=LC_MESSAGES=C", "EnvironmentFile=-" + DEFAULTS,
+            "Environment=LC_MESSAGES=C", "UnsetEnvironment=LC_ALL",
+            "EnvironmentFile=-" + DEFAULTS,
             "WantedBy=multi-user.target"} <= set(unit.read_text().splitlines())
     assert verify(unit) == (0, "")
     broken = tmp_path / "broken.service"
@@ -384,7 +387,7 @@ def test_purging_is_not_stopped_by_what_operators_do(machine, packed):
     machine.run(f"service tolkwd stop && rm {LOG} && mkdir {LOG} && mkdir /data"
                 " && mv /etc/opt/varden/tolk /data && ln -s /data/tolk /etc/opt/varden/tolk")
     machine.run("dpkg --purge tolkwd")
-    assert machine.run("dpkg-query --list tolkwd | tail -n 1 | cut -c1-2").strip() != "pc"
+    machine.run("dpkg-query --status tolkwd", expect=1)
 
 
 @on_a_machine
@@ -411,6 +414,26 @@ def test_another_process_with_its_number_is_no_watchdog(machine, packed):
     assert "tolkwd is not running" in machine.run("service tolkwd status", expect=1)
     # Nor is the init script itself, whose name is the same.
     machine.run("echo $$ >/run/tolkwd.pid; exec /etc/init.d/tolkwd start")
+    assert "tolkwd is running" in machine.run("service tolkwd status")
+
+
+@on_a_machine
+def test_commands_are_asked_in_english(machine, packed):
+    install_configured(machine, packed("DEB"))
+    machine.run("service tolkwd stop; LC_ALL=C.UTF-8 /etc/init.d/tolkwd start")
+    variables = machine.run(f"tr '\\0' '\\n' </proc/{daemon(machine)}/environ").splitlines()
+    assert "LC_MESSAGES=C" in variables
+    assert [variable for variable in variables if variable.startswith("LC_ALL=")] == []
+
+
+@on_a_machine
+def test_a_restart_without_a_configuration_leaves_it_as_it_is(machine, packed):
+    install_configured(machine, packed("DEB"))
+    watchdog = daemon(machine)
+    machine.run(f"rm {CONFIGURATION}")
+    for action in ("restart", "force-reload", "try-restart"):
+        assert "left as it is" in machine.run(f"service tolkwd {action}", expect=6)
+    assert daemon(machine) == watchdog
     assert "tolkwd is running" in machine.run("service tolkwd status")
 
 
