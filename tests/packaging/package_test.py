@@ -330,9 +330,10 @@ def test_it_may_be_installed_behind_a_link(machine, packed):
 
 
 @on_a_machine
-def test_an_init_script_that_was_removed_stays_so(machine, packed, tmp_path):
+@pytest.mark.parametrize("links", ["true", "update-rc.d tolkwd remove"], ids=["links", "no links"])
+def test_an_init_script_that_was_removed_stays_so(machine, packed, tmp_path, links):
     install_configured(machine, packed("DEB"))
-    machine.run("service tolkwd stop && rm /etc/init.d/tolkwd")
+    machine.run(f"service tolkwd stop && rm /etc/init.d/tolkwd && {links}")
     upgrade(machine, packed, tmp_path)
     assert not machine.exists("/etc/init.d/tolkwd")
     machine.run("dpkg --remove tolkwd && dpkg --purge tolkwd")
