@@ -166,6 +166,21 @@ int ProcessStatistics::GetThresholdMemoryUsage() const noexcept
     return thresholdMemoryUsage;
 }
 
+int ProcessStatistics::GetAverageCPUUsage() const noexcept
+{
+    return averageCPUUsage;
+}
+
+int ProcessStatistics::GetNumberOfThreads() const noexcept
+{
+    return numberOfThreads;
+}
+
+int ProcessStatistics::GetMemoryUsage() const noexcept
+{
+    return memoryUsage;
+}
+
 void ProcessStatistics::UpdatePID()
 {
     const int found = Utility::str2int(Utility::pidof(name));

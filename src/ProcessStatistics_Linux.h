@@ -67,6 +67,11 @@ public:
     [[nodiscard]] int GetThresholdThreadCount() const noexcept;
     [[nodiscard]] int GetThresholdMemoryUsage() const noexcept;
 
+    // The figures of the last Refresh that could read them.
+    [[nodiscard]] int GetAverageCPUUsage() const noexcept;
+    [[nodiscard]] int GetNumberOfThreads() const noexcept;
+    [[nodiscard]] int GetMemoryUsage() const noexcept;
+
     // Looks the process up again; a new id, or none (0), makes the next Refresh a fresh baseline.
     void UpdatePID();
 

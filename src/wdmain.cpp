@@ -17,15 +17,12 @@ namespace {
 
 constexpr const char* kInstallation = "/etc/opt/varden/tolk/cimom";
 constexpr const char* kInstallerPidFile = "/var/run/breminstall.pid";
-constexpr const char* kPingFolder = "/opt/varden/tolk/bin/";
 
 // The marker of a finished installation, and the command that sets it.
 constexpr const char* kMarker = "/etc/opt/varden/tolk/wd.nxinstalled";
 constexpr const char* kSetMarker = "touch /etc/opt/varden/tolk/wd.nxinstalled";
 
 constexpr unsigned kInstallerPauseSeconds = 60;
-constexpr int kLeastRefreshSeconds = 120;
-constexpr int kDefaultRefreshSeconds = 10800;
 constexpr int kBadCommandLineStatus = 2;
 constexpr int kNotFound = -1;
 

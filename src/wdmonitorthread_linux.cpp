@@ -5,7 +5,6 @@
 #include <atomic>
 #include <climits>
 #include <cstdlib>
-#include <optional>
 #include <string_view>
 #include <utility>
 
@@ -24,12 +23,6 @@ pthread_rwlock_t pingreclock;
 namespace {
 
 constexpr const char* kModule = "wdmonitorthread";
-
-constexpr int kRetries = 3;
-constexpr unsigned kFirstRetryPauseSeconds = 30;
-constexpr unsigned kGeneralRetryPauseSeconds = 60;
-constexpr unsigned kFunctionalRetryPauseSeconds = 60;
-constexpr unsigned kFunctionalRecoveryPauseSeconds = 1;
 
 // A first line is mostly much shorter.
 constexpr std::size_t kReadBlockBytes = 256;
@@ -80,17 +73,6 @@ bool monitoringenabled()
     return std::atomic_ref(globalenable).load() != 0;
 }
 
-long number(const std::string& text)
-{
-    return std::strtol(text.c_str(), nullptr, 10);
-}
-
-// sleep() counts unsigned: without the bounds a negative interval would be a pause of a century.
-void pausefor(long seconds)
-{
-    sleep(static_cast<unsigned>(std::clamp<long long>(seconds, 0, UINT_MAX)));
-}
-
 bool contains(const std::string& line, const char* word)
 {
     return line.find(word) != std::string::npos;
@@ -109,23 +91,23 @@ void runforeffect(const std::string& command)
     [[maybe_unused]] const int ignored = std::system(command.c_str());
 }
 
-// What the file holds up to its first newline, or nothing where it cannot be opened.
-std::optional<std::string> readfirstline(const std::string& path)
+// Runs the command and takes what its output holds up to the first newline. Both outputs go to one
+// file, each from its beginning.
+pingoutcome ask(std::string command, const std::string& path)
 {
+    pingoutcome outcome{.command = std::move(command) + " 1>" + path + " 2>" + path};
+    outcome.state = runforstate(outcome.command);
     wdinputfile file(path);
-    if (!file.isopen()) {
-        return std::nullopt;
-    }
-    std::string line;
+    outcome.opened = file.isopen();
     std::array<char, kReadBlockBytes> block; // read() fills what is taken from it
     for (auto piece = file.read(block); !piece.empty(); piece = file.read(block)) {
         const std::size_t newline = piece.find('\n');
-        line.append(piece.substr(0, newline));
+        outcome.firstline.append(piece.substr(0, newline));
         if (newline != std::string_view::npos) {
             break;
         }
     }
-    return line;
+    return outcome;
 }
 
 // Only services of the configuration in force are stopped and started.
@@ -173,6 +155,47 @@ void lograting(functionalpingresult result, const std::string& answer)
 }
 
 } // namespace
+
+long settingnumber(const std::string& text)
+{
+    return std::strtol(text.c_str(), nullptr, 10);
+}
+
+// sleep() counts unsigned: without the bounds a negative interval would be a pause of a century.
+unsigned pauseseconds(long interval) noexcept
+{
+    return static_cast<unsigned>(std::clamp<long long>(interval, 0, UINT_MAX));
+}
+
+std::string statusfile(const service& svc)
+{
+    return _tmp_file_path + "agent." + svc.name.str();
+}
+
+std::string functionalfile(const service& svc)
+{
+    return _tmp_file_path + "agent.functionalping." + svc.name.str();
+}
+
+std::string stopcommand(const service& svc)
+{
+    return svc.stopcmd == kNoCommand ? "service " + svc.name.str() + " stop" : svc.stopcmd.str();
+}
+
+std::string startcommand(const service& svc)
+{
+    return svc.startcmd == kNoCommand ? "service " + svc.name.str() + " start" : svc.startcmd.str();
+}
+
+pingoutcome askstatus(const service& svc)
+{
+    return ask("service " + svc.name.str() + " status", statusfile(svc));
+}
+
+pingoutcome askfunction(const service& svc)
+{
+    return ask(svc.functionalpingcmd, functionalfile(svc));
+}
 
 // Upper and lower case are words of their own; a mixed-case word matches nothing. The order counts:
 // "unused" is a service that does not run, though the message of the unknown ones names it too.
@@ -278,17 +301,13 @@ int wdmonitorthread::generalping(const service& svc)
         return kGeneralPingRefused;
     }
     wdlog(kModule, kLevelDebug, "enter of general ping, after get read lock.");
-    const std::string statusfile = _tmp_file_path + "agent." + svc.name.str();
-    const std::string command =
-        "service " + svc.name.str() + " status 1>" + statusfile + " 2>" + statusfile;
-    const int state = runforstate(command);
-    const auto found = readfirstline(statusfile);
-    if (!found) {
+    const pingoutcome outcome = askstatus(svc);
+    if (!outcome.opened) {
         wdlog(kModule, kLevelDebug, "Unable to open service status file.");
     }
-    const std::string line = found.value_or("");
-    wdlog(kModule, kLevelDebug, "command = ", command, ", result = ", line, ", state = ", state);
-    return ratestatus(line, state);
+    wdlog(kModule, kLevelDebug, "command = ", outcome.command, ", result = ", outcome.firstline,
+          ", state = ", outcome.state);
+    return ratestatus(outcome.firstline, outcome.state);
 }
 
 int wdmonitorthread::generalrecover(int lastping)
@@ -323,15 +342,13 @@ int wdmonitorthread::functionalping()
     if (svc.functionalpingcmd == kNoCommand) {
         return kFunctionalPingRefused;
     }
-    const std::string outputfile = _tmp_file_path + "agent.functionalping." + svc.name.str();
-    runforeffect(svc.functionalpingcmd.str() + " 1>" + outputfile + " 2>" + outputfile);
-    const auto found = readfirstline(outputfile);
-    if (!found) {
+    const pingoutcome outcome = askfunction(svc);
+    if (!outcome.opened) {
         wdlog(kModule, kLevelDebug, " unable to open service status file.");
     }
-    const std::string answer = found.value_or("");
-    const functionalpingresult result = rateanswer(answer);
-    lograting(result, answer);
+    // Only the answer counts, not the exit status.
+    const functionalpingresult result = rateanswer(outcome.firstline);
+    lograting(result, outcome.firstline);
     return result;
 }
 
@@ -424,9 +441,9 @@ int wdmonitorthread::retrygeneralping()
 
 void wdmonitorthread::pausegeneral() const
 {
-    const long interval = number(montarget.monitoredservice.genpinginterval);
+    const long interval = settingnumber(montarget.monitoredservice.genpinginterval);
     wdlog(kModule, kLevelDebug, "General ping sleep ", interval);
-    pausefor(interval);
+    sleep(pauseseconds(interval));
 }
 
 // Reports the end of an outage, or gives up and ends the thread.
@@ -511,9 +528,9 @@ int wdmonitorthread::retryfunctionalping()
 
 void wdmonitorthread::pausefunctional() const
 {
-    const long interval = number(montarget.monitoredservice.funpinginterval);
+    const long interval = settingnumber(montarget.monitoredservice.funpinginterval);
     wdlog(kModule, kLevelDebug, "Functional ping sleep ", interval);
-    pausefor(interval);
+    sleep(pauseseconds(interval));
 }
 
 // Reports the end of a failure, or gives up and ends the thread.
@@ -535,11 +552,10 @@ void wdmonitorthread::concludefunctional(int recoveries, int lastping) const
 void wdmonitorthread::stopmonitored() const
 {
     const service& svc = montarget.monitoredservice;
-    std::string command = svc.stopcmd;
-    if (command != kNoCommand) {
+    const std::string command = stopcommand(svc);
+    if (svc.stopcmd != kNoCommand) {
         wdlog(kModule, kLevelDebug, "User provided stop command: ", command);
     } else {
-        command = "service " + svc.name.str() + " stop";
         wdlog(kModule, kLevelDebug, "Service stop command:", command);
     }
     if (isconfigured(svc)) {
@@ -553,13 +569,12 @@ void wdmonitorthread::stopdependents()
           "number of dependent services = ", montarget.dependentservices.size());
     for (const service& dependent : montarget.dependentservices) {
         wdlog(kModule, kLevelDebug, "Trying to stop service ", dependent.name);
-        std::string command = dependent.stopcmd;
-        if (command != kNoCommand) {
+        const std::string command = stopcommand(dependent);
+        if (dependent.stopcmd != kNoCommand) {
             // Command and name stand back to back; so they do in every log there is.
             wdlog(kModule, kLevelDebug, "User provided stop command dep: ", command,
                   dependent.name);
         } else {
-            command = "service " + dependent.name.str() + " stop";
             wdlog(kModule, kLevelDebug, "Service stop command dep:", command);
         }
         if (generalping(dependent) != kServiceNotRunning && isconfigured(dependent)) {
@@ -578,11 +593,10 @@ void wdmonitorthread::startmonitored()
         return;
     }
     wdlog(kModule, kLevelDebug, "service is not up hence will start it ", svc.name);
-    std::string command = svc.startcmd;
-    if (command != kNoCommand) {
+    const std::string command = startcommand(svc);
+    if (svc.startcmd != kNoCommand) {
         wdlog(kModule, kLevelDebug, "User provided command start:", command);
     } else {
-        command = "service " + svc.name.str() + " start";
         wdlog(kModule, kLevelDebug, "Service command start:", command);
     }
     if (isconfigured(svc)) {
@@ -596,11 +610,10 @@ void wdmonitorthread::startdependents()
 {
     wdlog(kModule, kLevelDebug, "Now start dependent services");
     for (const service& dependent : montarget.dependentservices) {
-        std::string command = dependent.startcmd;
-        if (command != kNoCommand) {
+        const std::string command = startcommand(dependent);
+        if (dependent.startcmd != kNoCommand) {
             wdlog(kModule, kLevelDebug, "User provided command start dep:", command);
         } else {
-            command = "service " + dependent.name.str() + " start";
             wdlog(kModule, kLevelDebug, "Service command start dep:", command);
         }
         if (generalping(dependent) != kServiceRunning && isconfigured(dependent)) {
@@ -611,5 +624,5 @@ void wdmonitorthread::startdependents()
 
 long wdmonitorthread::maxrecoveries() const
 {
-    return number(montarget.monitoredservice.maxattemptofwakeup);
+    return settingnumber(montarget.monitoredservice.maxattemptofwakeup);
 }

@@ -33,6 +33,20 @@ extern int globalenable;
 // Made by the manager before the threads of a generation start, destroyed after all are joined.
 extern pthread_rwlock_t pingreclock;
 
+// The fixed part of the cycle's course.
+inline constexpr int kRetries = 3;
+inline constexpr unsigned kFirstRetryPauseSeconds = 30;
+inline constexpr unsigned kGeneralRetryPauseSeconds = 60;
+inline constexpr unsigned kFunctionalRetryPauseSeconds = 60;
+inline constexpr unsigned kFunctionalRecoveryPauseSeconds = 1;
+
+// What an interval or a limit of the configuration is as a number; 0 for text without one. Any
+// thread, no lock.
+long settingnumber(const std::string& text);
+
+// The pause, in seconds, that an interval of so many makes: none below 0. Any thread, no lock.
+unsigned pauseseconds(long interval) noexcept;
+
 // What a general ping tells.
 enum generalpingresult : int {
     kGeneralPingRefused = -1, // no read lock, nothing was run
@@ -50,6 +64,30 @@ enum functionalpingresult : int {
     kCommandNotFound = 2,
     kAnswerUnclear = 3,
 };
+
+// Where the output of the status command, and of the functional check, of `svc` goes. Any thread,
+// no lock.
+std::string statusfile(const service& svc);
+std::string functionalfile(const service& svc);
+
+// What stops and starts `svc` in a recovery. Any thread, no lock.
+std::string stopcommand(const service& svc);
+std::string startcommand(const service& svc);
+
+// What came of the command of a ping.
+struct pingoutcome {
+    std::string command{};   // as the shell got it
+    int state = -1;          // its exit status, or -1 where it did not end normally
+    bool opened = false;     // whether the file with its output could be opened
+    std::string firstline{}; // of this output; empty where there is none
+};
+
+// Runs the status command, or the functional check, of `svc` and reads what it printed, in the file
+// that it leaves in the pings' folder. Waits for
+// as long as it takes. Any thread; takes no lock: whoever pings while recoveries may run holds
+// pingreclock for reading meanwhile.
+pingoutcome askstatus(const service& svc);
+pingoutcome askfunction(const service& svc);
 
 // Rates the first line of a status command's output; `state` is the command's exit status, or -1
 // where it did not end normally. Logs the rating at DEBUG. Any thread, no lock.

@@ -11,12 +11,19 @@ inline std::string configPath;
 // Path of the local log file ("-l").
 inline std::string wdlocallogpath;
 
+// A refresh period below the least is the default. Seconds.
+inline constexpr int kLeastRefreshSeconds = 120;
+inline constexpr int kDefaultRefreshSeconds = 10800;
+
 // Refresh period in seconds ("-t"): after so many one-second ticks the configuration is read
 // afresh.
 inline int globalrefresh = 0;
 
 // Whether DEBUG lines are written ("-g").
 inline bool debugenable = false;
+
+// The value of _tmp_file_path.
+inline constexpr const char* kPingFolder = "/opt/varden/tolk/bin/";
 
 // Folder, with trailing slash, of the files that capture what the pings' commands print.
 // Its users know it by this name, reserved or not.

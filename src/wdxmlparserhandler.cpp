@@ -1,7 +1,6 @@
 #include "wdxmlparserhandler.h"
 
 #include <algorithm>
-#include <array>
 #include <string_view>
 #include <unordered_set>
 
@@ -22,30 +21,6 @@ namespace {
 // The two module names of the listing. Log filters in use know both, the trailing blank included.
 constexpr const char* kListingModule = "wdxmlparserhandler ";
 constexpr const char* kLimitsModule = "wdxmlparserhandler";
-
-struct fieldelement {
-    std::string_view name;
-    wdtext service::*field;
-};
-
-constexpr std::array<fieldelement, 16> kFieldElements{{
-    {"name", &service::name},
-    {"binarypath", &service::binarypath},
-    {"startcmd", &service::startcmd},
-    {"stopcmd", &service::stopcmd},
-    {"functionalpingcmd", &service::functionalpingcmd},
-    {"genpinginterval", &service::genpinginterval},
-    {"funpinginterval", &service::funpinginterval},
-    {"maxattemptofwakeup", &service::maxattemptofwakeup},
-    {"messageformat", &service::messageformat},
-    {"hackmessagehandler", &service::hackmessagehandler},
-    {"sendmessagehandler", &service::sendmessagehandler},
-    {"MaxFPSkips", &service::MaxFPSkips},
-    {"ThresholdAverageCPUUsage", &service::ThresholdAverageCPUUsage},
-    {"ThresholdMemoryUsage", &service::ThresholdMemoryUsage},
-    {"ThresholdThreadCount", &service::ThresholdThreadCount},
-    {"ThresholdHandleCount", &service::ThresholdHandleCount},
-}};
 
 // The field that an element of this name fills, or null. Most files give the fields in this order:
 // the search begins behind the field found before.
@@ -159,9 +134,20 @@ void endElement(const std::string& /*name*/)
     }
 }
 
+void endDocument()
+{
+    collectservices();
+    for (const auto& finished : xmlparser::alltargets) {
+        listmonitored(finished.monitoredservice);
+        for (const auto& dependent : finished.dependentservices) {
+            listdependent(dependent);
+        }
+    }
+}
+
 // Adds as addservice does, but with an index of the names: searching the list for every service of
 // a file takes a time that grows with their square.
-void endDocument()
+void collectservices()
 {
     xmlparser::allservices.clear();
     std::unordered_set<std::string_view> names;
@@ -172,11 +158,7 @@ void endDocument()
     };
     for (const auto& finished : xmlparser::alltargets) {
         add(finished.monitoredservice);
-        listmonitored(finished.monitoredservice);
-        for (const auto& dependent : finished.dependentservices) {
-            add(dependent);
-            listdependent(dependent);
-        }
+        std::for_each(finished.dependentservices.begin(), finished.dependentservices.end(), add);
     }
 }
 

@@ -15,11 +15,39 @@
 // raises nothing of its own. The state outlives a parse and is reset by nobody.
 #pragma once
 
+#include <array>
 #include <stack>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "wdmonitortarget.h"
+
+// A field element's name and the field that it fills.
+struct fieldelement {
+    std::string_view name;
+    wdtext service::*field;
+};
+
+// All that there are.
+inline constexpr std::array<fieldelement, 16> kFieldElements{{
+    {"name", &service::name},
+    {"binarypath", &service::binarypath},
+    {"startcmd", &service::startcmd},
+    {"stopcmd", &service::stopcmd},
+    {"functionalpingcmd", &service::functionalpingcmd},
+    {"genpinginterval", &service::genpinginterval},
+    {"funpinginterval", &service::funpinginterval},
+    {"maxattemptofwakeup", &service::maxattemptofwakeup},
+    {"messageformat", &service::messageformat},
+    {"hackmessagehandler", &service::hackmessagehandler},
+    {"sendmessagehandler", &service::sendmessagehandler},
+    {"MaxFPSkips", &service::MaxFPSkips},
+    {"ThresholdAverageCPUUsage", &service::ThresholdAverageCPUUsage},
+    {"ThresholdMemoryUsage", &service::ThresholdMemoryUsage},
+    {"ThresholdThreadCount", &service::ThresholdThreadCount},
+    {"ThresholdHandleCount", &service::ThresholdHandleCount},
+}};
 
 extern std::stack<std::string> xercecstack;    // elements opened and not closed, innermost on top
 extern std::string charparse;                  // the last text token
@@ -38,10 +66,13 @@ void characters(const std::string& text);
 // open or the innermost one is of an unknown name.
 void endElement(const std::string& name);
 
-// The end of the file.
+// The end of the file: collects the services and lists all in the log.
 void endDocument();
 
+// Rebuilds xmlparser::allservices from xmlparser::alltargets.
+void collectservices();
+
 // Appends a copy of `candidate` to `services` and returns 1, unless a service of that name is
-// there already: then 0, and nothing changes. Searches the whole list: endDocument, which adds
+// there already: then 0, and nothing changes. Searches the whole list: collectservices, which adds
 // thousands, keeps an index instead.
 int addservice(const service& candidate, std::vector<service>& services);

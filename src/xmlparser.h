@@ -1,20 +1,11 @@
-// Reads the configuration file with a small tokenizer of its own and hands each token to the
-// handler (wdxmlparserhandler.h). Owns the two lists that loading a file fills.
-//
-// The dialect is narrow: elements with text, no attributes, no comments, no entities, one
-// declaration at the first byte, and a root `wdtargets` whose closing tag holds the last ">" of the
-// file. What strays from it is not diagnosed but read by the rules in xmlparser.cpp. Reading
-// always ends at the end of the text and never leaves it.
+// Reads the configuration file: hands each of its tokens (xmlscan.h) to the handler
+// (wdxmlparserhandler.h). Owns the two lists that loading a file fills.
 #pragma once
 
 #include <string>
 #include <vector>
 
 #include "wdmonitortarget.h"
-
-// The tokenizer's white space: the first kControlCount characters, nothing else.
-extern const char control[20];
-inline constexpr std::size_t kControlCount = 4;
 
 class xmlparser {
 public:

@@ -83,7 +83,9 @@ PLACEHOLDERS = {
         "getpid()": "PID",
         "threadid": "TID",
         "command": "COMMAND",
-        "line": "LINE",
+        "outcome.command": "COMMAND",
+        "outcome.firstline": "LINE",
+        "outcome.state": "STATUS",
         "state": "STATUS",
         "answer": "ANSWER",
     },
@@ -117,7 +119,7 @@ _CARRIERS = {
     ("wdmain.cpp", "STDERR_FILENO"): 4,
     ("wdmain.cpp", "refusecommandline"): 1,
     ("wdmain.cpp", "writestandard"): 1,  # in refusecommandline
-    ("xmlparser.cpp", "throw"): 1,  # caught by the manager
+    ("xmlscan.cpp", "throw"): 1,  # caught by the manager
 }
 
 # Looked for without the tokenizer, too.

@@ -162,7 +162,7 @@ EXTRA = "not in the sources"
                  id="the table of options"),
     pytest.param("wdmain.cpp", "\"output log file", "\"log file",
                  [MISSING + "stderr log file path not specified", EXTRA], id="a refusal"),
-    pytest.param("xmlparser.cpp", "input file: 0", "input file: 1",
+    pytest.param("xmlscan.cpp", "input file: 0", "input file: 1",
                  [MISSING + "stderr error, unable to open the input file: 1", EXTRA],
                  id="standard error"),
     pytest.param(PINGS, BESIDE, "//" + BESIDE, [EXTRA], id="a message commented out"),

@@ -597,6 +597,19 @@ TEST_F(Statistics, NonNumericFieldsReadAsZero)
     EXPECT_EQ(check(), changed + figures(0, 0, 0, false));
 }
 
+TEST_F(Statistics, FiguresCanBeAskedFor)
+{
+    statis(stat("7", "3", "800"));
+    stats.UpdatePID();
+    EXPECT_EQ(stats.Refresh(), 0);
+    World::current().now += 2;
+    statis(stat("9", "4", "900"));
+    EXPECT_EQ(stats.Refresh(), 0);
+    EXPECT_EQ(stats.GetAverageCPUUsage(), 1000);
+    EXPECT_EQ(stats.GetNumberOfThreads(), 4);
+    EXPECT_EQ(stats.GetMemoryUsage(), 900);
+}
+
 TEST_F(Statistics, CopyTakesTheFiguresAlong)
 {
     statis(stat("0", "51", "1"));
