@@ -1,0 +1,38 @@
+#include "finding.h"
+
+#include <algorithm>
+#include <tuple>
+#include <utility>
+
+#include "rules.h"
+
+namespace check {
+
+findings::findings(std::set<std::string, std::less<>> allowed) : left(std::move(allowed)) {}
+
+void findings::add(std::string_view rule, severity level, std::size_t place, std::string message)
+{
+    const std::string_view name = rulenamed(rule).name; // lives as long as the program
+    if (!left.contains(name)) {
+        all.push_back({place, level, name, std::move(message)});
+    }
+}
+
+std::vector<finding> findings::sorted() const
+{
+    const auto order = [](const finding& one) {
+        return std::make_tuple(one.place, -static_cast<int>(one.level), one.rule,
+                               std::string_view(one.message));
+    };
+    std::vector<finding> result = all;
+    std::sort(result.begin(), result.end(), [&order](const finding& one, const finding& other) {
+        return order(one) < order(other);
+    });
+    const auto same = [&order](const finding& one, const finding& other) {
+        return order(one) == order(other);
+    };
+    result.erase(std::unique(result.begin(), result.end(), same), result.end());
+    return result;
+}
+
+} // namespace check

@@ -1,0 +1,18 @@
+#include "ruletables.h"
+
+#include <array>
+
+namespace check {
+
+namespace {
+
+constexpr std::array<rule, 0> kRules{};
+
+} // namespace
+
+std::span<const rule> machinerules() noexcept
+{
+    return kRules;
+}
+
+} // namespace check

@@ -1,0 +1,225 @@
+// tolkwd-check: tells what the daemon will make of a configuration, before it does. The command
+// line, and the order of the steps.
+
+#include <cstdio>
+#include <cstdlib>
+#include <exception>
+#include <iostream>
+#include <set>
+#include <stdexcept>
+#include <string>
+#include <system_error>
+#include <utility>
+#include <vector>
+
+#include <unistd.h>
+
+#include <CLI/CLI.hpp>
+
+#include "daemonview.h"
+#include "finding.h"
+#include "json.h"
+#include "load.h"
+#include "machine.h"
+#include "plan.h"
+#include "printable.h"
+#include "probe.h"
+#include "report.h"
+#include "rules.h"
+#include "shape.h"
+#include "sourcetext.h"
+#include "values.h"
+#include "wdLocalLog_linux.h"
+#include "wdsettings.h"
+
+namespace {
+
+using namespace check;
+
+constexpr int kUsageStatus = 64;
+constexpr int kFailureStatus = 70; // of the checker itself, not of the file
+
+struct options {
+    std::string file;
+    std::set<std::string, std::less<>> allowed;
+    std::string explained;
+    int refresh = kDefaultRefreshSeconds;
+    bool listrules = false;
+    bool plan = false;
+    bool probe = false;
+    bool yes = false;
+    bool json = false;
+};
+
+bool colourwanted()
+{
+    const auto set = [](const char* name) {
+        const char* value = std::getenv(name);
+        return value != nullptr ? std::string(value) : std::string();
+    };
+    return isatty(STDOUT_FILENO) != 0 && set("NO_COLOR").empty() && set("TERM") != "dumb";
+}
+
+int explain(const std::string& name)
+{
+    const rule& wanted = rulenamed(name);
+    std::cout << wanted.name << ": " << wanted.summary << "\n\n"
+              << wanted.explanation << "\n\nwrong:\n"
+              << wanted.wrong << "\n\nright:\n"
+              << wanted.right << '\n';
+    return 0;
+}
+
+int listrules()
+{
+    for (const rule& each : allrules()) {
+        std::cout << each.name << "  " << each.summary << '\n';
+    }
+    return 0;
+}
+
+// Ends the process where the command line is wrong, or asks for nothing but help.
+options parse(int argc, char** argv)
+{
+    CLI::App app("Tells what tolkwd will make of a configuration, and what is wrong with it.",
+                 "tolkwd-check");
+    options chosen;
+    const CLI::Validator arule(
+        [](std::string& name) {
+            return isrule(name) ? std::string() : "no rule is named " + inquotes(name);
+        },
+        "", "rule");
+    app.add_option("FILE", chosen.file, "The configuration; - for standard input");
+    app.add_flag("--plan", chosen.plan, "Tell what an outage of each service will look like");
+    app.add_option("-t", chosen.refresh,
+                   "The daemon's -t, its refresh period in seconds, for --plan")
+        ->type_name("SECONDS");
+    app.add_flag("--probe", chosen.probe,
+                 "Run each status command and each check once, after asking");
+    app.add_flag("--yes", chosen.yes, "Do not ask before --probe runs anything");
+    app.add_flag("--json", chosen.json, "Write everything as one JSON object");
+    app.add_option("--allow", chosen.allowed, "Do not report what this rule finds; repeatable")
+        ->type_name("RULE")
+        ->allow_extra_args(false)
+        ->check(arule);
+    app.add_option("--explain", chosen.explained, "Explain a rule, with examples")
+        ->type_name("RULE")
+        ->check(arule);
+    app.add_flag("--rules", chosen.listrules, "List all rules");
+    app.set_version_flag("--version", "tolkwd-check " TOLKWD_VERSION);
+    try {
+        app.parse(argc, argv);
+        if (chosen.file.empty() && chosen.explained.empty() && !chosen.listrules) {
+            throw CLI::RequiredError("FILE");
+        }
+    } catch (const CLI::ParseError& error) {
+        std::exit(app.exit(error) == 0 ? 0 : kUsageStatus);
+    }
+    return chosen;
+}
+
+// A probe runs what the file says, as who asks for it: nobody is to do that by mistake.
+bool probeconfirmed(const options& chosen)
+{
+    if (chosen.yes) {
+        return true;
+    }
+    std::cerr << "This runs the status command and the check of every target once. Go on? [y/N] "
+              << std::flush;
+    std::string answer;
+    std::getline(std::cin, answer);
+    return answer == "y" || answer == "yes";
+}
+
+int unreadable(const options& chosen, const std::string& reason)
+{
+    findings found(chosen.allowed);
+    found.add("unreadable-file", severity::error, kNoPlace, "the file cannot be read: " + reason);
+    const sourcetext nothing("");
+    daemonview view;
+    const auto sorted = found.sorted();
+    if (chosen.json) {
+        std::cout << resultjson(chosen.file, nothing, view, sorted).dump(2) << '\n';
+    } else {
+        writefindings(std::cout, chosen.file, nothing, sorted, colourwanted());
+    }
+    return statusof(sorted);
+}
+
+int checkfile(const options& chosen, const sourcetext& source)
+{
+    findings found(chosen.allowed);
+    const daemonview view = readasdaemon(source.text());
+    checkshape(source, view, found);
+    checkvalues(view, found);
+    checkmachine(chosen.file, view, found);
+    std::vector<targetprobe> probes;
+    if (chosen.probe) {
+        probes = probetargets(view, found);
+    }
+    checkload(view, durationsof(probes), found);
+    const auto sorted = found.sorted();
+    const int refresh =
+        chosen.refresh < kLeastRefreshSeconds ? kDefaultRefreshSeconds : chosen.refresh;
+    if (chosen.json) {
+        auto result = resultjson(chosen.file, source, view, sorted);
+        if (chosen.plan) {
+            result["plan"] = planjson(makeplan(view, refresh));
+        }
+        if (chosen.probe) {
+            result["probe"] = probejson(probes);
+        }
+        std::cout << result.dump(2) << '\n';
+    } else {
+        const bool colour = colourwanted();
+        writefindings(std::cout, chosen.file, source, sorted, colour);
+        if (chosen.plan) {
+            writeplan(std::cout, makeplan(view, refresh), colour);
+        }
+        if (chosen.probe) {
+            writeprobe(std::cout, probes, colour);
+        }
+    }
+    return statusof(sorted);
+}
+
+int run(const options& chosen)
+{
+    if (!chosen.explained.empty()) {
+        return explain(chosen.explained);
+    }
+    if (chosen.listrules) {
+        return listrules();
+    }
+    // What the daemon's functions log has to go somewhere; as debug lines are off, nothing does.
+    const wdLocalLog log("/dev/null");
+    _tmp_file_path = kPingFolder;
+    std::string text;
+    try {
+        text = readwhole(chosen.file);
+    } catch (const std::system_error& error) {
+        return unreadable(chosen, error.code().message());
+    }
+    if (chosen.probe && !probeconfirmed(chosen)) {
+        std::cerr << "nothing was run\n";
+        return kUsageStatus;
+    }
+    return checkfile(chosen, sourcetext(std::move(text)));
+}
+
+} // namespace
+
+int main(int argc, char** argv)
+{
+    try {
+        const int status = run(parse(argc, argv));
+        std::cout.flush();
+        if (!std::cout) {
+            throw std::runtime_error("the output cannot be written");
+        }
+        return status;
+    } catch (const std::exception& error) {
+        (void)std::fprintf(stderr, "tolkwd-check: %s\n", error.what());
+        return kFailureStatus;
+    }
+}

@@ -1,0 +1,45 @@
+// The file's text in memory, and the lines and columns of its bytes.
+#pragma once
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace check {
+
+// Both count from 1. A column is a character, or a byte that is no part of one.
+struct position {
+    std::size_t line;
+    std::size_t column;
+};
+
+// One thread's; no lock.
+class sourcetext {
+public:
+    explicit sourcetext(std::string text);
+
+    [[nodiscard]] std::string_view text() const noexcept { return content; }
+
+    // Of the byte at `place`; a place behind the end is the end.
+    [[nodiscard]] position at(std::size_t place) const;
+
+    // The line, without its end, in which `place` stands, and where it begins.
+    struct line {
+        std::string_view text;
+        std::size_t begin;
+    };
+    [[nodiscard]] line lineof(std::size_t place) const;
+
+private:
+    [[nodiscard]] std::size_t lineindex(std::size_t place) const;
+
+    std::string content;
+    std::vector<std::size_t> begins; // of each line
+};
+
+// The whole content of the file `path`, or of standard input for "-"; raises std::system_error
+// where it cannot be read.
+std::string readwhole(const std::string& path);
+
+} // namespace check
