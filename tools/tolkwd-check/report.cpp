@@ -1,6 +1,7 @@
 #include "report.h"
 
 #include <algorithm>
+#include <map>
 #include <string_view>
 
 #include "printable.h"
@@ -13,6 +14,9 @@ namespace {
 constexpr std::size_t kShownBytes = 120;
 constexpr std::size_t kShownBefore = 60;
 constexpr std::size_t kNumberWidth = 5;
+
+// Whoever has this many to mend needs no more of them.
+constexpr std::size_t kShownOfARule = 1000;
 
 struct look {
     std::string_view word;
@@ -76,12 +80,27 @@ void writesource(std::ostream& out, const sourcetext& source, std::size_t place,
     }
     const std::string cut = begin > 0 ? "..." : "";
     const std::string before = cut + printable(shown.substr(0, column - begin));
-    std::string number = std::to_string(source.at(place).line);
+    std::string number = std::to_string(source.linenumber(place));
     number.insert(0, kNumberWidth - std::min(kNumberWidth, number.size()), ' ');
     out << number << " | " << cut << printable(shown) << (end < line.text.size() ? "..." : "")
         << '\n'
         << std::string(number.size(), ' ') << " | " << below(before) << in(kGreen, "^", colour)
         << '\n';
+}
+
+void writefinding(std::ostream& out, const std::string& file, const sourcetext& source,
+                  const finding& each, bool colour)
+{
+    const bool placed = each.place != kNoPlace;
+    const position where = placed ? source.at(each.place) : position{1, 1};
+    const std::string prefix =
+        file + ":" + std::to_string(where.line) + ":" + std::to_string(where.column) + ":";
+    const look look = lookof(each.level);
+    out << in(kBold, prefix, colour) << ' ' << in(look.colour, std::string(look.word) + ":", colour)
+        << ' ' << printable(each.message) << " [" << each.rule << "]\n";
+    if (placed && !source.text().empty()) {
+        writesource(out, source, each.place, colour);
+    }
 }
 
 } // namespace
@@ -90,17 +109,16 @@ void writefindings(std::ostream& out, const std::string& name, const sourcetext&
                    const std::vector<finding>& found, bool colour)
 {
     const std::string file = printable(name);
+    std::map<std::string_view, std::size_t> count;
     for (const finding& each : found) {
-        const bool placed = each.place != kNoPlace;
-        const position where = placed ? source.at(each.place) : position{1, 1};
-        const std::string prefix =
-            file + ":" + std::to_string(where.line) + ":" + std::to_string(where.column) + ":";
-        const look look = lookof(each.level);
-        out << in(kBold, prefix, colour) << ' '
-            << in(look.colour, std::string(look.word) + ":", colour) << ' '
-            << printable(each.message) << " [" << each.rule << "]\n";
-        if (placed && !source.text().empty()) {
-            writesource(out, source, each.place, colour);
+        if (++count[each.rule] <= kShownOfARule) {
+            writefinding(out, file, source, each, colour);
+        }
+    }
+    for (const auto& [rule, all] : count) {
+        if (all > kShownOfARule) {
+            out << file << ": " << all - kShownOfARule << " more of one rule; --json has all ["
+                << rule << "]\n";
         }
     }
 }

@@ -11,7 +11,8 @@
 namespace check {
 
 // Writes the findings, each with its line of the file and a caret below its place. `name` is the
-// file's, as it was given; `colour`: with the terminal's colours. One thread.
+// file's, as it was given; `colour`: with the terminal's colours. Of one rule's the first thousand
+// are shown and the rest counted. One thread.
 void writefindings(std::ostream& out, const std::string& name, const sourcetext& source,
                    const std::vector<finding>& found, bool colour);
 

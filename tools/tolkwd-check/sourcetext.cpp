@@ -52,16 +52,25 @@ std::size_t sourcetext::lineindex(std::size_t place) const
 position sourcetext::at(std::size_t place) const
 {
     place = std::min(place, content.size());
-    const std::size_t number = lineindex(place);
-    const std::string_view before =
-        std::string_view(content).substr(begins[number], place - begins[number]);
-    return {number + 1, characters(before) + 1};
+    const std::size_t index = lineindex(place);
+    if (index != counted.index || place < counted.place) {
+        counted = {index, begins[index], 0};
+    }
+    const auto stretch = std::string_view(content).substr(counted.place, place - counted.place);
+    counted = {index, place, counted.characters + characters(stretch)};
+    return {index + 1, counted.characters + 1};
+}
+
+std::size_t sourcetext::linenumber(std::size_t place) const
+{
+    return lineindex(std::min(place, content.size())) + 1;
 }
 
 sourcetext::line sourcetext::lineof(std::size_t place) const
 {
-    const std::size_t begin = begins[lineindex(std::min(place, content.size()))];
-    const std::size_t end = std::min(content.find('\n', begin), content.size());
+    const std::size_t index = lineindex(std::min(place, content.size()));
+    const std::size_t begin = begins[index];
+    const std::size_t end = index + 1 < begins.size() ? begins[index + 1] - 1 : content.size();
     return {std::string_view(content).substr(begin, end - begin), begin};
 }
 
