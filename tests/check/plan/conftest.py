@@ -1,0 +1,26 @@
+"""Options of the tests that let the daemon do what it is planned to do."""
+
+import pathlib
+import sys
+
+import pytest
+
+HERE = pathlib.Path(__file__).resolve().parent
+sys.path.insert(0, str(HERE.parents[1] / "system"))
+
+import outages  # noqa: E402 -- needs the path
+
+
+def pytest_addoption(parser):
+    group = parser.getgroup("tolkwd")
+    group.addoption("--tolkwd", type=pathlib.Path, required=True, help="the daemon")
+    group.addoption("--tolkwd-check", type=pathlib.Path, required=True, help="what plans it")
+    group.addoption("--clock", type=pathlib.Path, required=True, help="the clock to preload")
+
+
+@pytest.fixture
+def machine(request, tmp_path):
+    """A machine for one outage, with results of its own."""
+    def program(name):
+        return request.config.getoption(name).resolve()
+    return outages.Machine(program("tolkwd"), program("tolkwd_check"), program("clock"), tmp_path)
