@@ -1,0 +1,2 @@
+#!/bin/sh
+[ "$1" = right ] || rmdir /opt/varden/tolk/bin
