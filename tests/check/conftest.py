@@ -1,9 +1,15 @@
-"""The option of the checker's tests."""
+"""The option that all tests of the checker take."""
 
 import pathlib
 
+import pytest
+
 
 def pytest_addoption(parser):
-    group = parser.getgroup("tolkwd-check")
-    group.addoption("--tolkwd-check", type=pathlib.Path, required=True,
-                    help="the program to test")
+    parser.getgroup("tolkwd").addoption("--tolkwd-check", type=pathlib.Path, required=True,
+                                        help="the program to test")
+
+
+@pytest.fixture(scope="session")
+def program(request):
+    return request.config.getoption("tolkwd_check").resolve()

@@ -118,16 +118,23 @@ options parse(int argc, char** argv)
     return chosen;
 }
 
-// A probe runs what the file says, as who asks for it: nobody is to do that by mistake.
-bool probeconfirmed(const options& chosen)
+// A probe runs what the file says, as who asks for it: nobody is to do that by mistake. What was
+// read from standard input cannot be followed by an answer.
+bool probeconfirmed(const options& chosen, const daemonview& view)
 {
-    if (chosen.yes) {
+    const auto question = probequestion(view);
+    if (chosen.yes || !question) {
         return true;
     }
-    std::cerr << "This runs the status command and the check of every target once. Go on? [y/N] "
-              << std::flush;
+    if (chosen.file == "-" && isatty(STDIN_FILENO) == 0) {
+        std::cerr << "standard input is the configuration and cannot answer whether to run its "
+                     "commands: give --yes, or the name of a file\n";
+        return false;
+    }
+    std::cerr << *question << std::flush;
     std::string answer;
     std::getline(std::cin, answer);
+    std::cerr << (isatty(STDIN_FILENO) == 0 ? "\n" : ""); // nobody has pressed Return
     return answer == "y" || answer == "yes";
 }
 
@@ -150,6 +157,10 @@ int checkfile(const options& chosen, const sourcetext& source)
 {
     findings found(chosen.allowed);
     const daemonview view = readasdaemon(source.text());
+    if (chosen.probe && !probeconfirmed(chosen, view)) {
+        std::cerr << "nothing was run\n";
+        return kUsageStatus;
+    }
     checkshape(source, view, found);
     checkvalues(view, found);
     checkmachine(chosen.file, view, found);
@@ -173,10 +184,15 @@ int checkfile(const options& chosen, const sourcetext& source)
     } else {
         const bool colour = colourwanted();
         writefindings(std::cout, chosen.file, source, sorted, colour);
+        // An empty line between the parts.
+        bool written = !sorted.empty();
         if (chosen.plan) {
+            std::cout << (written ? "\n" : "");
             writeplan(std::cout, makeplan(view, refresh), colour);
+            written = true;
         }
-        if (chosen.probe) {
+        if (!probes.empty()) {
+            std::cout << (written ? "\n" : "");
             writeprobe(std::cout, probes, colour);
         }
     }
@@ -199,10 +215,6 @@ int run(const options& chosen)
         text = readwhole(chosen.file);
     } catch (const std::system_error& error) {
         return unreadable(chosen, error.code().message());
-    }
-    if (chosen.probe && !probeconfirmed(chosen)) {
-        std::cerr << "nothing was run\n";
-        return kUsageStatus;
     }
     return checkfile(chosen, sourcetext(std::move(text)));
 }

@@ -1,26 +1,359 @@
 #include "probe.h"
 
-#include <nlohmann/json.hpp>
+#include <algorithm>
+#include <chrono>
+#include <functional>
+#include <thread>
+#include <utility>
+
+#include "ProcessStatistics_Linux.h"
+#include "interrupt.h"
+#include "printable.h"
+#include "reason.h"
+#include "surroundings.h"
+#include "wdmonitorthread_linux.h"
 
 namespace check {
 
-std::vector<targetprobe> probetargets(const daemonview& view, findings& /*found*/)
+namespace {
+
+using clocktype = std::chrono::steady_clock;
+
+// The daemon's clock has whole seconds: with fewer between two readings a figure would be coarse.
+constexpr std::chrono::seconds kLeastBetweenReadings{2};
+
+double secondssince(clocktype::time_point begin)
 {
-    return std::vector<targetprobe>(view.targets.size());
+    return std::chrono::duration<double>(clocktype::now() - begin).count();
+}
+
+// Shows on one line of a terminal what is waited for.
+class progress {
+public:
+    explicit progress(const surroundings& around) : out(around) {}
+
+    void show(const std::string& text)
+    {
+        const std::size_t width = characters(text);
+        const std::size_t blanks = shown > width ? shown - width : 0;
+        out.tell('\r' + text + std::string(blanks, ' '));
+        shown = width;
+    }
+    void clear() { out.tell('\r' + std::string(shown, ' ') + '\r'); }
+
+private:
+    const surroundings& out;
+    std::size_t shown = 0;
+};
+
+commandprobe madeof(std::string command, pingoutcome outcome, double seconds)
+{
+    return {.command = std::move(command),
+            .firstline = std::move(outcome.firstline),
+            .readable = outcome.opened,
+            .state = outcome.state,
+            .seconds = seconds,
+            .result = 0,
+            .reason = {}};
+}
+
+// The daemon's function says what an answer means; words that lead elsewhere are no reason.
+void rate(commandprobe& tried, int result, reason why)
+{
+    tried.result = result;
+    if (why.verdict == result) {
+        tried.reason = std::move(why.text);
+    }
+}
+
+commandprobe trystatus(const service& svc)
+{
+    const auto begin = clocktype::now();
+    pingoutcome outcome = askstatus(svc);
+    const double seconds = secondssince(begin);
+    commandprobe tried =
+        madeof("service " + svc.name.str() + " status", std::move(outcome), seconds);
+    rate(tried, ratestatus(tried.firstline, tried.state),
+         statusreason(tried.firstline, tried.state));
+    return tried;
+}
+
+commandprobe trycheck(const service& svc)
+{
+    const auto begin = clocktype::now();
+    pingoutcome outcome = askfunction(svc);
+    const double seconds = secondssince(begin);
+    commandprobe tried = madeof(svc.functionalpingcmd, std::move(outcome), seconds);
+    rate(tried, rateanswer(tried.firstline), answerreason(tried.firstline));
+    return tried;
+}
+
+// The figures of a target's process, taken twice, for the processor's is one over time.
+class processreading {
+public:
+    explicit processreading(const service& svc) : path(svc.binarypath.str())
+    {
+        statistics.SetName(path);
+        statistics.SetThresholdAverageCPUUsage(svc.ThresholdAverageCPUUsage);
+        statistics.SetThresholdMemoryUsage(svc.ThresholdMemoryUsage);
+        statistics.SetThresholdThreadCount(svc.ThresholdThreadCount);
+    }
+
+    // Whether there is a process to read from.
+    bool read()
+    {
+        before = std::exchange(pid, Utility::str2int(Utility::pidof(path)));
+        if (pid == 0) {
+            return false;
+        }
+        statistics.UpdatePID();
+        known = statistics.Refresh() == 0;
+        return known;
+    }
+
+    [[nodiscard]] processprobe result() const
+    {
+        processprobe process;
+        process.pid = known ? pid : 0;
+        process.threads.threshold = statistics.GetThresholdThreadCount();
+        process.memory.threshold = statistics.GetThresholdMemoryUsage();
+        process.processor.threshold = statistics.GetThresholdAverageCPUUsage();
+        if (process.pid != 0) {
+            process.threads.value = statistics.GetNumberOfThreads();
+            process.memory.value = statistics.GetMemoryUsage();
+        }
+        if (process.pid != 0 && before == pid) {
+            process.processor.value = statistics.GetAverageCPUUsage();
+        }
+        return process;
+    }
+
+private:
+    std::string path;
+    ProcessStatistics statistics;
+    int pid = 0;
+    int before = 0;
+    bool known = false;
+};
+
+// Whether the daemon ever compares the figures with the thresholds.
+bool figurescount(const service& svc)
+{
+    return !(svc.functionalpingcmd == kNoCommand) && Utility::str2int(svc.MaxFPSkips) != 0;
+}
+
+targetprobe trytarget(const service& svc, progress& shown, const std::function<bool()>& maygoon)
+{
+    targetprobe probe{.name = svc.name,
+                      .binarypath = svc.binarypath,
+                      .maxskips = svc.MaxFPSkips,
+                      .status = {},
+                      .check = {},
+                      .process = {}};
+    shown.show("waiting for the status command of " + inquotes(probe.name));
+    probe.status = trystatus(svc);
+    if (maygoon() && !(svc.functionalpingcmd == kNoCommand)) {
+        shown.show("waiting for the check of " + inquotes(probe.name));
+        probe.check = trycheck(svc);
+    }
+    return probe;
+}
+
+// The work of a probe, in the surroundings made for it.
+class prober {
+public:
+    prober(const daemonview& probed, const surroundings& around) : view(probed), shown(around)
+    {
+        readings.reserve(view.targets.size());
+        for (const targetview& target : view.targets) {
+            readings.emplace_back(*target.monitored.record);
+        }
+    }
+
+    // Ends early when it may not go on; what it has done is worth nothing then.
+    void run(const std::function<bool()>& maygoon)
+    {
+        const bool any = readfigures(maygoon);
+        const auto begin = clocktype::now();
+        for (const targetview& target : view.targets) {
+            if (!maygoon()) {
+                break;
+            }
+            probes.push_back(trytarget(*target.monitored.record, shown, maygoon));
+        }
+        if (any && maygoon()) {
+            shown.show("waiting for the figures of the processes");
+            std::this_thread::sleep_until(begin + kLeastBetweenReadings);
+        }
+        readfigures(maygoon);
+        shown.clear();
+    }
+
+    std::vector<targetprobe> results()
+    {
+        for (std::size_t i = 0; i < probes.size(); ++i) {
+            probes[i].process = readings[i].result();
+            probes[i].process.counts = figurescount(*view.targets[i].monitored.record);
+        }
+        return std::move(probes);
+    }
+
+private:
+    bool readfigures(const std::function<bool()>& maygoon)
+    {
+        bool any = false;
+        for (processreading& reading : readings) {
+            any = (maygoon() && reading.read()) || any;
+        }
+        return any;
+    }
+
+    const daemonview& view;
+    progress shown;
+    std::vector<processreading> readings;
+    std::vector<targetprobe> probes;
+};
+
+std::size_t placeof(const targetview& target)
+{
+    for (const std::size_t place :
+         {target.monitored.origins.at(fieldindex("name")).text, target.monitored.begin}) {
+        if (place != kNoPlace) {
+            return place;
+        }
+    }
+    return target.begin;
+}
+
+std::string answerwords(const commandprobe& tried)
+{
+    const std::string answer = tried.firstline.empty() ? "nothing" : inquotes(tried.firstline);
+    return "answers " + answer + (tried.reason.empty() ? "" : " (" + tried.reason + ")");
+}
+
+void findstatus(const targetprobe& probe, std::size_t place, findings& found)
+{
+    const std::string name = inquotes(probe.name);
+    const std::string answer = inquotes(probe.status.command) + ' ' + answerwords(probe.status);
+    switch (probe.status.result) {
+    case kServiceUnknown:
+        found.add("probe-status", severity::error, place,
+                  "the system does not know the service " + name + ": " + answer +
+                      "; the daemon ends this monitor until its next refresh: correct the name");
+        break;
+    case kServiceNotRunning:
+        found.add("probe-status", severity::warning, place,
+                  "the service " + name + " does not run: " + answer +
+                      "; the daemon would start it after three more pings");
+        break;
+    case kServiceUnclear:
+        found.add("probe-status", severity::warning, place,
+                  "whether the service " + name + " runs is not clear: " + answer +
+                      "; to the daemon it has failed, and after three more pings it would be "
+                      "stopped and started");
+        break;
+    default:
+        break;
+    }
+}
+
+void findcheck(const targetprobe& probe, std::size_t place, findings& found)
+{
+    // Of a service that does not run, no check can work, and the daemon makes none.
+    if (!probe.check || probe.status.result != kServiceRunning) {
+        return;
+    }
+    const std::string about = " of the service " + inquotes(probe.name) + ' ';
+    const std::string answer = answerwords(*probe.check);
+    if (probe.check->result == kCommandNotFound) {
+        found.add("probe-check", severity::error, place,
+                  "the check" + about + answer +
+                      ": to the daemon its command is missing, and it does nothing when the "
+                      "service fails: correct functionalpingcmd");
+    } else if (isfailure(probe.check->result)) {
+        found.add("probe-check", severity::warning, place,
+                  "the check" + about + answer +
+                      ": to the daemon the service fails, and after three more checks it would be "
+                      "stopped and started");
+    }
+}
+
+std::string abovewords(std::string_view key, const figureprobe& figure)
+{
+    return std::string(key) + " (" + std::to_string(*figure.value) + " of " +
+           std::to_string(figure.threshold) + ")";
+}
+
+std::string allabove(const processprobe& process)
+{
+    std::string words;
+    for (const auto& [key, figure] : {std::pair{"ThresholdThreadCount", process.threads},
+                                      std::pair{"ThresholdMemoryUsage", process.memory},
+                                      std::pair{"ThresholdAverageCPUUsage", process.processor}}) {
+        if (figure.busy()) {
+            words += (words.empty() ? "" : " and ") + abovewords(key, figure);
+        }
+    }
+    return words;
+}
+
+void findprocess(const targetprobe& probe, std::size_t place, findings& found)
+{
+    const processprobe& process = probe.process;
+    if (!process.counts) {
+        return;
+    }
+    const std::string name = inquotes(probe.name);
+    if (process.pid == 0 && probe.status.result == kServiceRunning) {
+        found.add("probe-process", severity::warning, place,
+                  "the service " + name + " runs, but pidof finds no process of " +
+                      inquotes(probe.binarypath) +
+                      ": the daemon would compare old figures with the thresholds, at first 0: "
+                      "correct binarypath");
+    }
+    if (process.busy()) {
+        const int skips = Utility::str2int(probe.maxskips);
+        const std::string often =
+            skips < 0 ? "without end" : "up to " + std::to_string(skips) + " times in a row";
+        found.add("probe-busy", severity::warning, place,
+                  "the service " + name + " is above " + allabove(process) +
+                      " now: the daemon takes it for busy and would leave its check out, " + often);
+    }
+}
+
+} // namespace
+
+std::vector<targetprobe> probetargets(const daemonview& view, findings& found)
+{
+    if (!view.loaded || view.targets.empty()) {
+        return {};
+    }
+    std::optional<surroundings> around(std::in_place);
+    prober work(view, *around);
+    workuntilinterrupted([&work](const std::function<bool()>& maygoon) { work.run(maygoon); },
+                         [&around] { around.reset(); });
+    std::vector<targetprobe> probes = work.results();
+    for (std::size_t i = 0; i < probes.size(); ++i) {
+        const std::size_t place = placeof(view.targets[i]);
+        findstatus(probes[i], place, found);
+        findcheck(probes[i], place, found);
+        findprocess(probes[i], place, found);
+    }
+    return probes;
 }
 
 std::vector<durations> durationsof(const std::vector<targetprobe>& probes)
 {
-    return std::vector<durations>(probes.size());
-}
-
-void writeprobe(std::ostream& /*out*/, const std::vector<targetprobe>& /*probes*/, bool /*colour*/)
-{
-}
-
-nlohmann::ordered_json probejson(const std::vector<targetprobe>& /*probes*/)
-{
-    return nlohmann::ordered_json::array();
+    std::vector<durations> taken;
+    taken.reserve(probes.size());
+    for (const targetprobe& probe : probes) {
+        durations each{.status = probe.status.seconds, .functional = std::nullopt};
+        if (probe.check) {
+            each.functional = probe.check->seconds;
+        }
+        taken.push_back(each);
+    }
+    return taken;
 }
 
 } // namespace check

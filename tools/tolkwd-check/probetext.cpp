@@ -1,0 +1,220 @@
+#include "probe.h"
+
+#include <array>
+#include <cstdio>
+
+#include <pwd.h>
+#include <unistd.h>
+
+#include "printable.h"
+#include "wdmonitorthread_linux.h"
+
+namespace check {
+
+namespace {
+
+constexpr std::size_t kShownBytes = 160; // of an answer
+constexpr double kBytesPerMebibyte = 1048576;
+constexpr double kFigurePerTick = 1000;
+constexpr const char* kIndent = "             ";
+
+struct verdict {
+    std::string_view words;
+    bool good;
+};
+
+verdict statusverdict(int result)
+{
+    switch (result) {
+    case kServiceRunning:
+        return {"running", true};
+    case kServiceNotRunning:
+        return {"not running", false};
+    case kServiceUnknown:
+        return {"unknown, its monitor would end", false};
+    default:
+        return {"unclear, counts as failed", false};
+    }
+}
+
+verdict checkverdict(int result)
+{
+    switch (result) {
+    case kAnswerCorrect:
+        return {"works", true};
+    case kCommandNotFound:
+        return {"missing, nothing would be done", false};
+    default:
+        return {"fails", false};
+    }
+}
+
+std::string_view colourof(const verdict& verdict)
+{
+    return verdict.good ? "\033[1;32m" : "\033[1;31m";
+}
+
+// With one digit behind the point, or none where that is 0.
+std::string rounded(double value)
+{
+    std::array<char, 64> text{};
+    (void)std::snprintf(text.data(), text.size(), "%.1f", value);
+    std::string number = text.data();
+    if (number.ends_with(".0")) {
+        number.resize(number.size() - 2);
+    }
+    return number;
+}
+
+std::string secondswords(double seconds)
+{
+    std::array<char, 64> text{};
+    (void)std::snprintf(text.data(), text.size(), "%.2f s", seconds);
+    return text.data();
+}
+
+std::string statewords(int state)
+{
+    return state < 0 ? "did not end normally" : "exit status " + std::to_string(state);
+}
+
+std::string linewords(const commandprobe& tried)
+{
+    if (!tried.readable) {
+        return "no output to read";
+    }
+    if (tried.firstline.empty()) {
+        return "nothing on the first line";
+    }
+    const bool cut = tried.firstline.size() > kShownBytes;
+    return '"' + printable(tried.firstline.substr(0, kShownBytes)) + (cut ? "..." : "\"");
+}
+
+void writecommand(std::ostream& out, std::string_view label, const commandprobe& tried,
+                  const verdict& verdict, bool colour)
+{
+    out << label;
+    if (colour) {
+        out << colourof(verdict);
+    }
+    out << verdict.words;
+    if (colour) {
+        out << "\033[m";
+    }
+    if (!tried.reason.empty()) {
+        out << ": " << tried.reason;
+    }
+    out << "   (" << statewords(tried.state) << ", " << secondswords(tried.seconds) << ")\n"
+        << kIndent << linewords(tried) << '\n';
+}
+
+std::string withunit(int value, std::string_view unit, const std::string& words)
+{
+    return std::to_string(value).append(unit).append(words.empty() ? "" : " (" + words + ")");
+}
+
+std::string memorywords(int pages)
+{
+    return rounded(pages * static_cast<double>(sysconf(_SC_PAGESIZE)) / kBytesPerMebibyte) + " MiB";
+}
+
+std::string processorwords(int figure)
+{
+    const auto ticks = static_cast<double>(sysconf(_SC_CLK_TCK));
+    return rounded(figure / kFigurePerTick / ticks * 100) + " %";
+}
+
+std::string nowords(int /*value*/)
+{
+    return "";
+}
+
+// Such as: memory 1755 pages (6.9 MiB) of 262144 (1024 MiB)
+std::string figurewords(std::string_view name, const figureprobe& figure, std::string_view unit,
+                        std::string (*words)(int))
+{
+    const std::string value =
+        figure.value ? withunit(*figure.value, unit, words(*figure.value)) : "not known";
+    return std::string(name).append(" ").append(value).append(" of ").append(
+        withunit(figure.threshold, "", words(figure.threshold)));
+}
+
+std::string busywords(const targetprobe& probe)
+{
+    if (!probe.check) {
+        return "the thresholds do not count: there is no check";
+    }
+    if (!probe.process.counts) {
+        return "the thresholds do not count: MaxFPSkips is 0";
+    }
+    if (!probe.process.busy()) {
+        return "not busy: the check would be made";
+    }
+    const int skips = Utility::str2int(probe.maxskips);
+    return "busy: the check would be left out, " +
+           (skips < 0 ? std::string("without end")
+                      : "up to " + std::to_string(skips) + " times in a row");
+}
+
+void writeprocess(std::ostream& out, const targetprobe& probe)
+{
+    const processprobe& process = probe.process;
+    out << "  process    ";
+    if (process.pid == 0) {
+        out << "pidof finds none of " << inquotes(probe.binarypath) << '\n';
+        return;
+    }
+    out << process.pid << ": " << figurewords("threads", process.threads, "", nowords) << ", "
+        << figurewords("memory", process.memory, " pages", memorywords) << ", "
+        << figurewords("processor", process.processor, "", processorwords) << '\n'
+        << kIndent << busywords(probe) << '\n';
+}
+
+std::string username()
+{
+    const uid_t user = geteuid();
+    const passwd* const entry = getpwuid(user);
+    return entry != nullptr ? printable(entry->pw_name) : "user " + std::to_string(user);
+}
+
+std::string counted(std::size_t count, const std::string& one)
+{
+    return std::to_string(count) + ' ' + one + (count == 1 ? "" : "s");
+}
+
+} // namespace
+
+std::optional<std::string> probequestion(const daemonview& view)
+{
+    if (!view.loaded || view.targets.empty()) {
+        return std::nullopt;
+    }
+    std::size_t checks = 0;
+    for (const targetview& target : view.targets) {
+        checks += target.monitored.record->functionalpingcmd == kNoCommand ? 0 : 1;
+    }
+    const std::size_t targets = view.targets.size();
+    return "This runs " + counted(targets + checks, "command") + " as " + username() + " (" +
+           counted(targets, "status command") + ", " + counted(checks, "check") +
+           "), and pidof for " + counted(targets, "program") +
+           (geteuid() == 0 ? "" : "; the daemon runs them as root") + ". Go on? [y/N] ";
+}
+
+void writeprobe(std::ostream& out, const std::vector<targetprobe>& probes, bool colour)
+{
+    for (const targetprobe& probe : probes) {
+        out << (colour ? "\033[1m" : "") << printable(probe.name) << (colour ? "\033[m" : "")
+            << '\n';
+        writecommand(out, "  status     ", probe.status, statusverdict(probe.status.result),
+                     colour);
+        if (probe.check) {
+            writecommand(out, "  check      ", *probe.check, checkverdict(probe.check->result),
+                         colour);
+        } else {
+            out << "  check      none\n";
+        }
+        writeprocess(out, probe);
+    }
+}
+
+} // namespace check
