@@ -1,0 +1,15 @@
+#!/bin/sh
+set -eu
+mkdir -p /opt/varden/tolk/bin
+service cron start
+
+# A program with three threads, under a name of its own.
+cp "$(readlink -f /usr/bin/python3)" /opt/threads
+/opt/threads -c '
+import threading
+import time
+for _ in range(2):
+    threading.Thread(target=time.sleep, args=(600,)).start()
+open("/opt/threads-run", "w").close()
+' >/dev/null 2>&1 &
+until [ -e /opt/threads-run ]; do sleep 0.05; done

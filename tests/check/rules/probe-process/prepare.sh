@@ -1,0 +1,4 @@
+#!/bin/sh
+set -eu
+mkdir -p /opt/varden/tolk/bin
+service cron start
