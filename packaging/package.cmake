@@ -10,10 +10,11 @@ set(CPACK_PACKAGE_DESCRIPTION
 command of the operator's whether it works. A service that keeps failing is
 stopped and started again, together with the services that depend on it, in a
 fixed order. The configuration is read afresh every few hours.
+tolkwd-check tells beforehand what the daemon will make of a configuration.
 Nothing is enabled or started before there is a configuration.")
 set(CPACK_PACKAGE_DIRECTORY ${PROJECT_SOURCE_DIR}/build/packages)
 set(CPACK_GENERATOR DEB RPM)
-# The program keeps its debug information in the build folder only.
+# The programs keep their debug information in the build folder only.
 set(CPACK_STRIP_FILES ON)
 # Some paths are absolute, see CMakeLists.txt.
 set(CPACK_SET_DESTDIR ON)
@@ -66,11 +67,13 @@ set(CPACK_RPM_PRE_UNINSTALL_SCRIPT_FILE ${rpm}/preun)
 set(CPACK_RPM_POST_UNINSTALL_SCRIPT_FILE ${rpm}/postun)
 file(STRINGS ${debian}/conffiles kept)
 list(TRANSFORM kept PREPEND "%config(noreplace) ")
-# Named, or its absolute path would make a configuration file of it, too.
-set(CPACK_RPM_USER_FILELIST ${kept} "%attr(0755,root,root) /opt/varden/tolk/bin/tolkwd")
+# Named, or their absolute paths would make configuration files of them, too.
+set(CPACK_RPM_USER_FILELIST ${kept} "%attr(0755,root,root) /opt/varden/tolk/bin/tolkwd"
+  "%attr(0755,root,root) /opt/varden/tolk/bin/tolkwd-check")
 # Folders of the system, which are not this package's.
 set(CPACK_RPM_EXCLUDE_FROM_AUTO_FILELIST_ADDITION
   /etc /etc/default /etc/init.d /etc/opt /opt /usr/lib/systemd /usr/lib/systemd/system
-  /usr/sbin /usr/share/man /usr/share/man/man5 /usr/share/man/man8)
+  /usr/sbin /usr/share/bash-completion /usr/share/bash-completion/completions /usr/share/man
+  /usr/share/man/man5 /usr/share/man/man8)
 
 include(CPack)

@@ -125,11 +125,20 @@ def upgrade(machine, packed, folder):
 def test_every_file_has_its_place(packed):
     files = files_of_deb(packed("DEB"))
     assert {"opt/varden/tolk/bin/tolkwd", "usr/sbin/tolkwd", EXAMPLE[1:], DEFAULTS[1:],
+            "opt/varden/tolk/bin/tolkwd-check", "usr/sbin/tolkwd-check",
+            "usr/share/bash-completion/completions/tolkwd-check",
             "etc/init.d/tolkwd", "usr/lib/systemd/system/tolkwd.service",
             "usr/share/man/man8/tolkwd.8.gz", "usr/share/man/man5/tolkwd.xml.5.gz",
+            "usr/share/man/man8/tolkwd-check.8.gz",
             "usr/share/doc/tolkwd/LICENSE", "usr/share/doc/tolkwd/OPERATING.md",
             "usr/share/doc/tolkwd/MESSAGES.md"} <= files
     assert CONFIGURATION[1:] not in files
+
+
+def test_the_programs_need_no_library_but_cs_and_cpps(packed):
+    depends = output("dpkg-deb", "--field", packed("DEB"), "Depends")
+    assert {one.split()[0] for one in depends.split(", ")} == {
+        "libc6", "libgcc-s1", "libstdc++6", "sysvinit-utils"}
 
 
 def test_rpm_holds_the_same(packed):
@@ -196,9 +205,10 @@ def test_an_installation_by_hand_overwrites_no_edited_file(build, tmp_path):
                        "PATH": "/usr/bin:/bin"}, check=True, stdout=subprocess.DEVNULL)
 
     install()
-    program = tmp_path / "opt/varden/tolk/bin/tolkwd"
-    assert program.stat().st_mode & 0o111 == 0o111
-    assert (tmp_path / "usr/sbin/tolkwd").readlink().as_posix() == "/opt/varden/tolk/bin/tolkwd"
+    for name in ("tolkwd", "tolkwd-check"):
+        program = tmp_path / "opt/varden/tolk/bin" / name
+        assert program.stat().st_mode & 0o111 == 0o111
+        assert (tmp_path / "usr/sbin" / name).readlink().as_posix() == f"{PINGS}/{name}"
     edited = tmp_path / EXAMPLE[1:]
     edited.write_text("edited")
     install()
@@ -241,6 +251,15 @@ def test_nothing_is_enabled_without_a_configuration(machine, packed):
     assert "tolkwd is not running" in machine.run("service tolkwd status", expect=3)
     assert enabled(machine) == []
     assert "there is no " + CONFIGURATION in machine.run("service tolkwd start", expect=6)
+
+
+@on_a_machine
+def test_the_checker_works_for_everybody(machine, packed):
+    machine.put(packed("DEB"), "package.deb")
+    machine.run("dpkg --install /package.deb")
+    ask = "setpriv --reuid nobody --clear-groups tolkwd-check "
+    assert "[unreadable-file]" in machine.run(ask + "/nowhere.xml", expect=2)
+    assert machine.run(ask + "--version").startswith("tolkwd-check ")
 
 
 @on_a_machine
