@@ -236,7 +236,12 @@ def test_the_unit_is_in_order(build, project, tmp_path):
             "StandardOutput=journal", "StandardError=journal", "LogRateLimitIntervalSec=0",
             "Environment=LC_MESSAGES=C", "UnsetEnvironment=LC_ALL",
             "EnvironmentFile=-" + DEFAULTS,
+            # The checker's findings, its end and its absence never stop a start.
+            "ExecStartPre=-/usr/bin/timeout -k 1 20 /opt/varden/tolk/bin/tolkwd-check "
+            + CONFIGURATION,
             "WantedBy=multi-user.target"} <= set(unit.read_text().splitlines())
+    assert verify(unit) == (0, "")
+    (tmp_path / "opt/varden/tolk/bin/tolkwd-check").unlink()
     assert verify(unit) == (0, "")
     broken = tmp_path / "broken.service"
     broken.write_text(unit.read_text().replace("RestartSec=10", "RestartSec=ten"))
