@@ -19,7 +19,9 @@ cd "$built/bench"
 "$root/bench/pieces/measure.py" --program pieces/bench_pieces --service process/service \
     --out "$results/pieces.json"
 lockwait/bench_lockwait --out "$results/lockwait.json"
+"$root/bench/check/measure.py" --check "$built/tools/tolkwd-check/tolkwd-check" \
+    --load check/bench_check_load --out "$results/check.json"
 "$root/bench/process/measure.py" --tolkwd "$built/src/tolkwd" --service process/service \
     --out "$results/process.json"
 
-"$root/bench/report/report.py" "$results"/{pieces,process,lockwait,counts}.json
+"$root/bench/report/report.py" "$results"/{pieces,check,process,lockwait,counts}.json

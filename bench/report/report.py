@@ -47,8 +47,8 @@ def machine():
     fields = dict(line.split(":", 1) for line in said_by("lscpu").splitlines() if ":" in line)
     memory = os.sysconf("SC_PAGE_SIZE") * os.sysconf("SC_PHYS_PAGES") / 2**30
     system = platform.freedesktop_os_release()["PRETTY_NAME"]
-    commit = said_by("git", "log", "-1", "--format=%h") + (
-        " with changes" if said_by("git", "status", "--porcelain", "--", "src", "bench") else "")
+    changes = said_by("git", "status", "--porcelain", "--", "src", "tools", "bench")
+    commit = said_by("git", "log", "-1", "--format=%h") + (" with changes" if changes else "")
     date = datetime.datetime.now(datetime.timezone.utc).strftime("%Y-%m-%d %H:%M UTC")
     packages = ("monit", "supervisor", "libexpat1", "libpugixml1v5")
     versions = ", ".join(f"{name} {said_by('dpkg-query', '-W', '-f=${Version}', name)}"
