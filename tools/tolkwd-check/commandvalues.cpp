@@ -133,8 +133,8 @@ void checkanswer(const serviceview& view, findings& found)
         found.add("check-output", severity::warning, placeof(view, kCheck),
                   fieldof(view, kCheck) +
                       " ends in a comment, \"&\" or \";\": the daemon appends 1>FILE 2>FILE, which "
-                      "then takes nothing of its output, and the check always fails; leave that "
-                      "end out");
+                      "then takes nothing of its output: the check fails, or an old answer is "
+                      "read for ever; leave that end out");
     } else if (split.compound) {
         found.add("check-output", severity::warning, placeof(view, kCheck),
                   fieldof(view, kCheck) +
