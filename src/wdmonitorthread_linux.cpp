@@ -91,11 +91,21 @@ void runforeffect(const std::string& command)
     [[maybe_unused]] const int ignored = std::system(command.c_str());
 }
 
-// Runs the command and takes what its output holds up to the first newline. Both outputs go to one
-// file, each from its beginning.
+// Both outputs go to one file, each from its beginning.
+std::string redirected(std::string command, const std::string& file)
+{
+    return std::move(command) + " 1>" + file + " 2>" + file;
+}
+
+std::string statuscommand(const service& svc, const std::string& file)
+{
+    return redirected("service " + svc.name.str() + " status", file);
+}
+
+// Runs the command and takes what its output, in the file `path`, holds up to the first newline.
 pingoutcome ask(std::string command, const std::string& path)
 {
-    pingoutcome outcome{.command = std::move(command) + " 1>" + path + " 2>" + path};
+    pingoutcome outcome{.command = std::move(command)};
     outcome.state = runforstate(outcome.command);
     wdinputfile file(path);
     outcome.opened = file.isopen();
@@ -177,6 +187,16 @@ std::string functionalfile(const service& svc)
     return _tmp_file_path + "agent.functionalping." + svc.name.str();
 }
 
+std::string statuscommand(const service& svc)
+{
+    return statuscommand(svc, statusfile(svc));
+}
+
+std::string functionalcommand(const service& svc)
+{
+    return redirected(svc.functionalpingcmd, functionalfile(svc));
+}
+
 std::string stopcommand(const service& svc)
 {
     return svc.stopcmd == kNoCommand ? "service " + svc.name.str() + " stop" : svc.stopcmd.str();
@@ -189,12 +209,14 @@ std::string startcommand(const service& svc)
 
 pingoutcome askstatus(const service& svc)
 {
-    return ask("service " + svc.name.str() + " status", statusfile(svc));
+    const std::string file = statusfile(svc);
+    return ask(statuscommand(svc, file), file);
 }
 
 pingoutcome askfunction(const service& svc)
 {
-    return ask(svc.functionalpingcmd, functionalfile(svc));
+    const std::string file = functionalfile(svc);
+    return ask(redirected(svc.functionalpingcmd, file), file);
 }
 
 // Upper and lower case are words of their own; a mixed-case word matches nothing. The order counts:

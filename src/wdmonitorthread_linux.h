@@ -70,7 +70,10 @@ enum functionalpingresult : int {
 std::string statusfile(const service& svc);
 std::string functionalfile(const service& svc);
 
-// What stops and starts `svc` in a recovery. Any thread, no lock.
+// What asks for the state of `svc` and what checks it, their output redirected to these files; and
+// what stops and starts it in a recovery. Any thread, no lock.
+std::string statuscommand(const service& svc);
+std::string functionalcommand(const service& svc);
 std::string stopcommand(const service& svc);
 std::string startcommand(const service& svc);
 

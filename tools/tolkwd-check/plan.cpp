@@ -36,11 +36,6 @@ plannedtime seconds(long long count) noexcept
     return {.seconds = count};
 }
 
-std::string redirected(const std::string& command, const std::string& path)
-{
-    return command + " 1>" + path + " 2>" + path;
-}
-
 bool haschecks(const service& svc)
 {
     return svc.functionalpingcmd != kNoCommand;
@@ -102,7 +97,7 @@ std::optional<checkplan> checkof(const service& svc)
     const auto ticks = static_cast<double>(sysconf(_SC_CLK_TCK));
     const auto page = static_cast<double>(sysconf(_SC_PAGESIZE));
     return checkplan{
-        .command = redirected(svc.functionalpingcmd, functionalfile(svc)),
+        .command = functionalcommand(svc),
         .every = roundof(svc),
         .skips = skips,
         .busy = busynessof(svc, skips),
@@ -267,8 +262,7 @@ targetplan planof(const targetview& target)
                     .program = svc.binarypath,
                     .attemptstext = svc.maxattemptofwakeup,
                     .attempts = settingnumber(svc.maxattemptofwakeup),
-                    .statuscommand =
-                        redirected("service " + svc.name.str() + " status", statusfile(svc)),
+                    .statuscommand = statuscommand(svc),
                     .every = roundof(svc),
                     .check = checkof(svc),
                     .recovery = recoveryof(target)};

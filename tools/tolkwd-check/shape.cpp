@@ -211,8 +211,9 @@ std::string cureof(const oddity& odd)
     case oddkind::cdata:
         return "write its text alone";
     case oddkind::doctype:
-    case oddkind::instruction:
         return "leave it out";
+    case oddkind::instruction:
+        return "put it there, or leave it out";
     case oddkind::attribute:
         return "write " + tag(printable(odd.name));
     case oddkind::emptytag:
@@ -310,13 +311,14 @@ private:
                 static_cast<std::size_t>(last - doc.oddities.begin())};
     }
 
-    // Puts what the daemon does otherwise down to an oddity, or reports it for itself.
+    // Puts what the daemon does otherwise down to an oddity. Without any the two readings should be
+    // the same; where they are not, that is told for itself.
     void harm(std::size_t odd, std::size_t place, std::string what)
     {
         if (odd != npos) {
             harms[odd].push_back(std::move(what));
         } else {
-            found.add("not-as-written", severity::error, place, std::move(what));
+            found.add("mismatched-tag", severity::error, place, std::move(what));
         }
     }
 
@@ -474,20 +476,21 @@ private:
     {
         const std::string& value = valueof(*taken.record, field).str();
         const origin& from = taken.origins.at(field);
+        const std::string effect = effectof(field, value);
         std::string message =
-            std::string(nameof(field)) + " is missing in " + inquotes(named(&written)) + ": it is ";
+            std::string(nameof(field)) + " is missing in " + inquotes(named(&written)) + ": ";
         if (from.element != kNoPlace) {
-            message += inquotes(value) + ", as in " + sourceof(from.element, written.monitored);
+            message += "it is " + inquotes(value) + ", as in " +
+                       sourceof(from.element, written.monitored) +
+                       (effect.empty() ? "" : ": " + effect);
         } else {
             const service& last = written.monitored ? monitorservice : monservicedep;
-            message += "empty at the start";
-            if (const std::string& later = valueof(last, field).str(); !later.empty()) {
-                message += ", and " + inquotes(later) + " after a refresh, which the last " +
-                           (written.monitored ? "service" : "dependent") + " of the file has";
+            const std::string& later = valueof(last, field).str();
+            message += "at the start it is empty" + (effect.empty() ? "" : " (" + effect + ")");
+            if (!later.empty()) {
+                message += ", after a refresh " + inquotes(later) + ", as in the last " +
+                           (written.monitored ? "service" : "dependent") + " of the file";
             }
-        }
-        if (const std::string effect = effectof(field, value); !effect.empty()) {
-            message += ": " + effect;
         }
         found.add("missing-field", severity::error, written.begin, std::move(message));
     }

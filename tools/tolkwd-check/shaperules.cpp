@@ -6,7 +6,7 @@ namespace check {
 
 namespace {
 
-constexpr std::array<rule, 23> kRules{{
+constexpr std::array<rule, 22> kRules{{
     {"unreadable-file", "the file cannot be read",
      "The daemon would write one line on standard error, watch nothing, and try again at the next "
      "refresh. Mend the path, or who may read the file.",
@@ -113,10 +113,6 @@ constexpr std::array<rule, 23> kRules{{
      "The file has no wdmonitortarget. The daemon runs, says nothing, and watches nothing.",
      "<wdtargets>\n</wdtargets>",
      "<wdtargets>\n<wdmonitortarget>...</wdmonitortarget>\n</wdtargets>"},
-    {"not-as-written", "the daemon reads something else than what is written",
-     "The daemon's reading and the plain one differ, and none of the other rules tells why. Write "
-     "the file in the form of the example, one element a line.",
-     "", ""},
 }};
 
 } // namespace

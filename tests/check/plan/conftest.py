@@ -1,4 +1,4 @@
-"""Options of the tests that let the daemon do what it is planned to do."""
+"""Further options of the tests that let the daemon do what it is planned to do."""
 
 import pathlib
 import sys
@@ -14,7 +14,6 @@ import outages  # noqa: E402 -- needs the path
 def pytest_addoption(parser):
     group = parser.getgroup("tolkwd")
     group.addoption("--tolkwd", type=pathlib.Path, required=True, help="the daemon")
-    group.addoption("--tolkwd-check", type=pathlib.Path, required=True, help="what plans it")
     group.addoption("--clock", type=pathlib.Path, required=True, help="the clock to preload")
 
 
