@@ -15,6 +15,7 @@
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 
+#include "surroundings.h"
 #include "wdLocalLog_linux.h"
 #include "wdmonitorthread_linux.h"
 #include "wdsettings.h"
@@ -112,7 +113,8 @@ protected:
     std::vector<targetprobe> probe(const std::vector<configured>& targets)
     {
         view = readasdaemon(configuration(targets));
-        return probetargets(view, found);
+        const outputfolder folder;
+        return probetargets(view, folder.path(), found);
     }
 
     // The findings, in order, as "rule severity".
@@ -368,7 +370,7 @@ TEST_F(Probe, RunsNothingOfAFileThatDoesNotLoad)
     view = readasdaemon(configuration({{}}) + "<>");
     ASSERT_EQ(view.targets.size(), 1U);
     ASSERT_FALSE(view.loaded);
-    EXPECT_TRUE(probetargets(view, found).empty());
+    EXPECT_TRUE(probetargets(view, outputfolder().path(), found).empty());
     EXPECT_FALSE(probequestion(view));
     EXPECT_FALSE(fs::exists(stage / "calls"));
 }

@@ -6,15 +6,11 @@
 
 namespace check {
 
-// Runs `work` in a thread of its own, waits for its end, and then runs `tidy`; what `work` raises
-// is passed on. `work` is given a function that it calls before each of its steps, and returns
-// where that says no: there was an interrupt.
-//
-// SIGINT, SIGTERM and SIGHUP, unless they are ignored, are interrupts. `work` is then waited for no
-// longer than a second, `tidy` is run, and the process ends with the signal's number and 128 as its
-// status, without any destructor. The main thread only, one call at a time; SIGUSR1 is taken
-// meanwhile.
-void workuntilinterrupted(const std::function<void(const std::function<bool()>&)>& work,
-                          const std::function<void()>& tidy);
+// Runs `work` in a process of its own and returns what it returns, a status of at most 255. SIGINT,
+// SIGTERM and SIGHUP, unless they are ignored, end that process at once, and so do a failure or a
+// signal of its own: then 128 and the signal's number is returned, behind a line on standard error.
+// Raises std::system_error where there can be no process. The main thread only, without others;
+// what was written to streams before has to be flushed.
+int runinterruptibly(const std::function<int()>& work);
 
 } // namespace check

@@ -4,6 +4,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <exception>
+#include <functional>
 #include <iostream>
 #include <set>
 #include <stdexcept>
@@ -18,6 +19,7 @@
 
 #include "daemonview.h"
 #include "finding.h"
+#include "interrupt.h"
 #include "json.h"
 #include "load.h"
 #include "machine.h"
@@ -28,6 +30,7 @@
 #include "rules.h"
 #include "shape.h"
 #include "sourcetext.h"
+#include "surroundings.h"
 #include "values.h"
 #include "wdLocalLog_linux.h"
 #include "wdsettings.h"
@@ -153,7 +156,8 @@ int unreadable(const options& chosen, const std::string& reason)
     return statusof(sorted);
 }
 
-int checkfile(const options& chosen, const sourcetext& source)
+// `folder`: for the output of commands, where there is a probe.
+int checkfile(const options& chosen, const sourcetext& source, const std::string& folder)
 {
     findings found(chosen.allowed);
     const daemonview view = readasdaemon(source.text());
@@ -166,7 +170,7 @@ int checkfile(const options& chosen, const sourcetext& source)
     checkmachine(chosen.file, view, found);
     std::vector<targetprobe> probes;
     if (chosen.probe) {
-        probes = probetargets(view, found);
+        probes = probetargets(view, folder, found);
     }
     checkload(view, durationsof(probes), found);
     const auto sorted = found.sorted();
@@ -199,6 +203,22 @@ int checkfile(const options& chosen, const sourcetext& source)
     return statusof(sorted);
 }
 
+// What `work` returns, if all that it says has been written.
+int guarded(const std::function<int()>& work)
+{
+    try {
+        const int status = work();
+        std::cout.flush();
+        if (!std::cout) {
+            throw std::runtime_error("the output cannot be written");
+        }
+        return status;
+    } catch (const std::exception& error) {
+        (void)std::fprintf(stderr, "tolkwd-check: %s\n", error.what());
+        return kFailureStatus;
+    }
+}
+
 int run(const options& chosen)
 {
     if (!chosen.explained.empty()) {
@@ -216,22 +236,18 @@ int run(const options& chosen)
     } catch (const std::system_error& error) {
         return unreadable(chosen, error.code().message());
     }
-    return checkfile(chosen, sourcetext(std::move(text)));
+    const sourcetext source(std::move(text));
+    if (!chosen.probe) {
+        return checkfile(chosen, source, "");
+    }
+    const outputfolder folder;
+    return runinterruptibly(
+        [&] { return guarded([&] { return checkfile(chosen, source, folder.path()); }); });
 }
 
 } // namespace
 
 int main(int argc, char** argv)
 {
-    try {
-        const int status = run(parse(argc, argv));
-        std::cout.flush();
-        if (!std::cout) {
-            throw std::runtime_error("the output cannot be written");
-        }
-        return status;
-    } catch (const std::exception& error) {
-        (void)std::fprintf(stderr, "tolkwd-check: %s\n", error.what());
-        return kFailureStatus;
-    }
+    return guarded([&] { return run(parse(argc, argv)); });
 }

@@ -2,12 +2,10 @@
 
 #include <algorithm>
 #include <chrono>
-#include <functional>
 #include <thread>
 #include <utility>
 
 #include "ProcessStatistics_Linux.h"
-#include "interrupt.h"
 #include "printable.h"
 #include "reason.h"
 #include "surroundings.h"
@@ -142,7 +140,7 @@ bool figurescount(const service& svc)
     return !(svc.functionalpingcmd == kNoCommand) && Utility::str2int(svc.MaxFPSkips) != 0;
 }
 
-targetprobe trytarget(const service& svc, progress& shown, const std::function<bool()>& maygoon)
+targetprobe trytarget(const service& svc, progress& shown)
 {
     targetprobe probe{.name = svc.name,
                       .binarypath = svc.binarypath,
@@ -152,67 +150,51 @@ targetprobe trytarget(const service& svc, progress& shown, const std::function<b
                       .process = {}};
     shown.show("waiting for the status command of " + inquotes(probe.name));
     probe.status = trystatus(svc);
-    if (maygoon() && !(svc.functionalpingcmd == kNoCommand)) {
+    if (!(svc.functionalpingcmd == kNoCommand)) {
         shown.show("waiting for the check of " + inquotes(probe.name));
         probe.check = trycheck(svc);
     }
     return probe;
 }
 
-// The work of a probe, in the surroundings made for it.
-class prober {
-public:
-    prober(const daemonview& probed, const surroundings& around) : view(probed), shown(around)
-    {
-        readings.reserve(view.targets.size());
-        for (const targetview& target : view.targets) {
-            readings.emplace_back(*target.monitored.record);
-        }
+// Reads the figures of all; whether there is a process to read from.
+bool readfigures(std::vector<processreading>& readings)
+{
+    bool any = false;
+    for (processreading& reading : readings) {
+        any = reading.read() || any;
     }
+    return any;
+}
 
-    // Ends early when it may not go on; what it has done is worth nothing then.
-    void run(const std::function<bool()>& maygoon)
-    {
-        const bool any = readfigures(maygoon);
-        const auto begin = clocktype::now();
-        for (const targetview& target : view.targets) {
-            if (!maygoon()) {
-                break;
-            }
-            probes.push_back(trytarget(*target.monitored.record, shown, maygoon));
-        }
-        if (any && maygoon()) {
-            shown.show("waiting for the figures of the processes");
-            std::this_thread::sleep_until(begin + kLeastBetweenReadings);
-        }
-        readfigures(maygoon);
-        shown.clear();
-    }
-
-    std::vector<targetprobe> results()
-    {
-        for (std::size_t i = 0; i < probes.size(); ++i) {
-            probes[i].process = readings[i].result();
-            probes[i].process.counts = figurescount(*view.targets[i].monitored.record);
-        }
-        return std::move(probes);
-    }
-
-private:
-    bool readfigures(const std::function<bool()>& maygoon)
-    {
-        bool any = false;
-        for (processreading& reading : readings) {
-            any = (maygoon() && reading.read()) || any;
-        }
-        return any;
-    }
-
-    const daemonview& view;
-    progress shown;
+// Runs everything, in the surroundings made for it.
+std::vector<targetprobe> tryall(const daemonview& view, const surroundings& around)
+{
+    progress shown(around);
     std::vector<processreading> readings;
+    readings.reserve(view.targets.size());
+    for (const targetview& target : view.targets) {
+        readings.emplace_back(*target.monitored.record);
+    }
+    const bool any = readfigures(readings);
+    const auto begin = clocktype::now();
     std::vector<targetprobe> probes;
-};
+    probes.reserve(view.targets.size());
+    for (const targetview& target : view.targets) {
+        probes.push_back(trytarget(*target.monitored.record, shown));
+    }
+    if (any) {
+        shown.show("waiting for the figures of the processes");
+        std::this_thread::sleep_until(begin + kLeastBetweenReadings);
+    }
+    readfigures(readings);
+    shown.clear();
+    for (std::size_t i = 0; i < probes.size(); ++i) {
+        probes[i].process = readings[i].result();
+        probes[i].process.counts = figurescount(*view.targets[i].monitored.record);
+    }
+    return probes;
+}
 
 std::size_t placeof(const targetview& target)
 {
@@ -323,16 +305,13 @@ void findprocess(const targetprobe& probe, std::size_t place, findings& found)
 
 } // namespace
 
-std::vector<targetprobe> probetargets(const daemonview& view, findings& found)
+std::vector<targetprobe> probetargets(const daemonview& view, const std::string& folder,
+                                      findings& found)
 {
     if (!view.loaded || view.targets.empty()) {
         return {};
     }
-    std::optional<surroundings> around(std::in_place);
-    prober work(view, *around);
-    workuntilinterrupted([&work](const std::function<bool()>& maygoon) { work.run(maygoon); },
-                         [&around] { around.reset(); });
-    std::vector<targetprobe> probes = work.results();
+    std::vector<targetprobe> probes = tryall(view, surroundings(folder));
     for (std::size_t i = 0; i < probes.size(); ++i) {
         const std::size_t place = placeof(view.targets[i]);
         findstatus(probes[i], place, found);

@@ -65,9 +65,9 @@ std::optional<std::string> probequestion(const daemonview& view);
 // it shows. Gives as many results as there are targets, or none where the file does not load. The
 // main thread only, without others: meanwhile the surroundings of the process are those of the
 // daemon's commands (surroundings.h), and its output, which the daemon's functions log to, is lost.
-// Raises std::system_error where there is no place for the commands' output. An interrupt ends the
-// process (interrupt.h).
-std::vector<targetprobe> probetargets(const daemonview& view, findings& found);
+// `folder`, with a slash at its end, takes the commands' output.
+std::vector<targetprobe> probetargets(const daemonview& view, const std::string& folder,
+                                      findings& found);
 
 // How long the commands took, for each target.
 std::vector<durations> durationsof(const std::vector<targetprobe>& probes);

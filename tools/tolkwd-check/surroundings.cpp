@@ -57,8 +57,16 @@ void ignoresignal(int signal, struct sigaction& before)
 
 } // namespace
 
-surroundings::surroundings()
-    : folder(makefolder()), pingfolder(std::exchange(_tmp_file_path, folder))
+outputfolder::outputfolder() : folder(makefolder()) {}
+
+outputfolder::~outputfolder()
+{
+    std::error_code failure; // there is nothing more to be done about it
+    std::filesystem::remove_all(folder, failure);
+}
+
+surroundings::surroundings(const std::string& folder)
+    : pingfolder(std::exchange(_tmp_file_path, folder))
 {
     std::cout.flush();
     const int null = open("/dev/null", O_RDWR); // not close-on-exec: it may be one of the three
@@ -96,8 +104,6 @@ surroundings::~surroundings()
         }
     }
     _tmp_file_path = pingfolder;
-    std::error_code failure; // there is nothing more to be done about it
-    std::filesystem::remove_all(folder, failure);
 }
 
 void surroundings::tell(std::string_view text) const

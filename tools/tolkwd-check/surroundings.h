@@ -11,18 +11,33 @@
 
 namespace check {
 
+// A private folder for the output of commands, gone when this is.
+class outputfolder {
+public:
+    // Raises std::system_error where it cannot be made.
+    outputfolder();
+    ~outputfolder();
+    outputfolder(const outputfolder&) = delete;
+    outputfolder& operator=(const outputfolder&) = delete;
+
+    // With a slash at its end.
+    [[nodiscard]] const std::string& path() const noexcept { return folder; }
+
+private:
+    std::string folder;
+};
+
 // As long as it lives, commands are run as the unit and the init script have the daemon run them:
-// in the folder /, with no input, answers in English, and SIGPIPE ignored. Their output goes to a
-// private folder instead of the pings' folder, where a running daemon would take it for that of its
-// own commands; what they and the log write besides goes to /dev/null. Then all is as it was
-// before, and the private folder is gone.
+// in the folder /, with no input, answers in English, and SIGPIPE ignored. Their output goes to
+// another folder than the pings' one, where a running daemon would take it for that of its own
+// commands; what they and the log write besides goes to /dev/null. Then all is as it was before.
 //
 // It changes the whole process: one at a time, and no other thread may write to the standard
 // streams or use the environment while one is made or destroyed.
 class surroundings {
 public:
-    // Raises std::system_error where the private folder cannot be made.
-    surroundings();
+    // `folder`: for the commands' output, with a slash at its end.
+    explicit surroundings(const std::string& folder);
     ~surroundings();
     surroundings(const surroundings&) = delete;
     surroundings& operator=(const surroundings&) = delete;
@@ -33,7 +48,6 @@ public:
 private:
     void setvariable(const std::string& name, const char* value);
 
-    std::string folder;
     std::string pingfolder;
     std::map<std::string, std::optional<std::string>> variables;
     std::array<int, 3> streams{}; // copies of the standard streams; -1: it was closed
