@@ -1,6 +1,6 @@
-// Ten thousand mistakes in the sample configuration, the same at each run: what the daemon's reader
-// makes of a file is what the checker says, and whatever it makes otherwise than it stands there is
-// found.
+// Ten thousand mistakes in the sample configuration (MUTATIONS), the same at each run: what the
+// daemon's reader makes of a file is what the checker says, and whatever it makes otherwise than it
+// stands there is found.
 
 #include <array>
 #include <cctype>
@@ -14,6 +14,8 @@
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include <unistd.h>
 
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
@@ -51,10 +53,15 @@ Record recordof(const service& svc)
     return record;
 }
 
+std::string mutatedfile()
+{
+    return ::testing::TempDir() + "mutated." + std::to_string(getpid());
+}
+
 // As a daemon does that has just started.
 Reading readbydaemon(const std::string& text)
 {
-    const std::string path = ::testing::TempDir() + "mutated.xml";
+    const std::string path = mutatedfile();
     std::ofstream(path, std::ios::binary) << text;
     xercecstack = {};
     charparse.clear();
@@ -416,6 +423,8 @@ protected:
         sample = {std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>()};
     }
 
+    ~Mutations() override { unlink(mutatedfile().c_str()); }
+
     // `text` is the sample with a mistake.
     void trymutation(const std::string& text, const Reading& meant)
     {
@@ -443,7 +452,7 @@ TEST_F(Mutations, SampleItselfIsReadAsItStandsAndDrawsNoFinding)
 
 TEST_F(Mutations, AreReadAsByTheDaemonAndFoundWhereTheyChangeSomething)
 {
-    constexpr int kMutations = 10000;
+    constexpr int kMutations = MUTATIONS;
     constexpr unsigned long kSeed = 20261121;
     const Reading meant = readbydaemon(sample);
     Mutator mutator(sample, kSeed);
