@@ -62,10 +62,12 @@ private:
     {
         const std::string folder = folderof(_tmp_file_path);
         if (const filefacts& facts = files.of(folder); facts.found == presence::kMissing) {
-            found.add("ping-folder", severity::warning, kNoPlace,
-                      "there is no folder " + inquotes(_tmp_file_path) +
-                          " on this machine: what pings and checks print has nowhere to go, so "
-                          "every one fails, and every service is restarted and given up");
+            found.add(
+                "ping-folder", severity::warning, kNoPlace,
+                "there is no folder " + inquotes(_tmp_file_path) +
+                    " on this machine: what pings and checks print has nowhere to go, so "
+                    "every one fails, and every service is restarted and given up; make it as "
+                    "root");
         } else if (facts.found == presence::kThere && !facts.folder) {
             found.add("ping-folder", severity::warning, kNoPlace,
                       inquotes(folder) + " is no folder: what pings and checks print has nowhere "
@@ -212,7 +214,8 @@ private:
         found.add("command-missing", check ? severity::error : severity::warning,
                   placeof(view, which),
                   fieldof(view, which) + " runs " + inquotes(named.name) +
-                      ", which is no program of this machine: " + consequence);
+                      ", which is no program of this machine: " + consequence +
+                      "; correct the name, or install the program");
     }
 
     const std::string& path;

@@ -147,6 +147,7 @@ int unreadable(const options& chosen, const std::string& reason)
     found.add("unreadable-file", severity::error, kNoPlace, "the file cannot be read: " + reason);
     const sourcetext nothing("");
     daemonview view;
+    view.loaded = false;
     const auto sorted = found.sorted();
     if (chosen.json) {
         std::cout << resultjson(chosen.file, nothing, view, sorted).dump(2) << '\n';

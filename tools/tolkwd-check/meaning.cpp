@@ -1,7 +1,5 @@
 #include "meaning.h"
 
-#include <string_view>
-
 #include "daemonview.h"
 #include "wdmonitorthread_linux.h"
 
@@ -77,6 +75,23 @@ std::string effectof(std::size_t field, const std::string& value)
         return "";
     }
     return effectofnumber(field, settingnumber(value));
+}
+
+std::string_view cureofempty(std::size_t field) noexcept
+{
+    const std::string_view name = kFieldElements.at(field).name;
+    if (isone(field, &service::name)) {
+        return "write the service's name";
+    }
+    if (isone(field, &service::binarypath)) {
+        return "write the path of its program";
+    }
+    if (name.ends_with("cmd")) {
+        return isone(field, &service::functionalpingcmd) ? "write NULL for no check"
+                                                         : "write NULL for the service command";
+    }
+    return counts(field, true) || isone(field, &service::ThresholdHandleCount) ? "write a number"
+                                                                               : "write NULL";
 }
 
 } // namespace check

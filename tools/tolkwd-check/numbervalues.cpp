@@ -36,7 +36,8 @@ constexpr std::array kNumberFields = {
     numberfield{&service::maxattemptofwakeup, meaning::kAttempts,
                 "the service is never asked and given up at once", "write 2 or more"},
     numberfield{&service::MaxFPSkips, meaning::kSkips,
-                "no check is left out, and the thresholds are not looked at", "write a number"},
+                "no check is left out, and the thresholds are not looked at",
+                "write a number of checks"},
     numberfield{&service::ThresholdAverageCPUUsage, meaning::kThreshold,
                 "the service counts as busy from its first tick on",
                 "write a number, 1000 for each per cent of a processor"},
@@ -129,7 +130,7 @@ public:
         if (!text.rest.empty()) {
             add("not-a-number", severity::warning,
                 ", of which the daemon takes " + std::to_string(number) +
-                    " and ignores the rest; write the number alone");
+                    " and ignores the rest; " + std::string(known.cure));
         }
         if (!text.fits && number > 0) {
             checkrange();
@@ -207,7 +208,7 @@ private:
         } else if (number == 1) {
             add("attempts-one", severity::warning,
                 ": after its only recovery the service is given up without another look, even if "
-                "it runs again; write one more than is to be relied on");
+                "it runs again; write 2 to rely on one recovery, 3 to rely on two");
         } else if (number < 0) {
             add("attempts-negative", severity::error,
                 ": the service is never asked, and its monitor keeps a processor busy; write 2 or "

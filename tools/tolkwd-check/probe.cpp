@@ -209,8 +209,11 @@ std::size_t placeof(const targetview& target)
 
 std::string answerwords(const commandprobe& tried)
 {
-    const std::string answer = tried.firstline.empty() ? "nothing" : inquotes(tried.firstline);
-    return "answers " + answer + (tried.reason.empty() ? "" : " (" + tried.reason + ")");
+    if (tried.firstline.empty()) {
+        return tried.reason.empty() ? "answers nothing" : "answers " + tried.reason;
+    }
+    return "answers " + inquotes(tried.firstline) +
+           (tried.reason.empty() ? "" : " (" + tried.reason + ")");
 }
 
 void findstatus(const targetprobe& probe, std::size_t place, findings& found)
@@ -256,7 +259,8 @@ void findcheck(const targetprobe& probe, std::size_t place, findings& found)
         found.add("probe-check", severity::warning, place,
                   "the check" + about + answer +
                       ": to the daemon the service fails, and after three more checks it would be "
-                      "stopped and started");
+                      "stopped and started; let the check print \"service: ok\", and nothing else, "
+                      "when all is well");
     }
 }
 

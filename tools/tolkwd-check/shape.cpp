@@ -198,16 +198,31 @@ std::string tell(const oddity& odd, std::string_view text)
     return "nothing may follow the closing tag of the root";
 }
 
-constexpr std::string_view kIntoAScript = "put a command that needs it in a script";
+constexpr std::string_view kIntoAScript = "put a command that needs \"<\" in a script";
+
+// What to write in place of an entity.
+std::string cureofentity(std::string_view name)
+{
+    constexpr std::array<std::pair<std::string_view, std::string_view>, 4> kMeant{
+        {{"&amp;", "&"}, {"&gt;", ">"}, {"&quot;", "\""}, {"&apos;", "'"}}};
+    for (const auto& [entity, character] : kMeant) {
+        if (name == entity) {
+            return std::string("write ").append(character);
+        }
+    }
+    return name == "&lt;" ? std::string(kIntoAScript) : "write the character itself";
+}
 
 // What to do about it.
 std::string cureof(const oddity& odd)
 {
     switch (odd.kind) {
     case oddkind::comment:
+        return "take the comment out";
     case oddkind::straytext:
+        return "take the text out";
     case oddkind::strayclosing:
-        return "take it out";
+        return "take this tag out";
     case oddkind::cdata:
         return "write its text alone";
     case oddkind::doctype:
@@ -219,7 +234,7 @@ std::string cureof(const oddity& odd)
     case oddkind::emptytag:
         return "write NULL for no command, or a number";
     case oddkind::unknown:
-        return similar(odd.name).empty() ? "take it out" : "";
+        return similar(odd.name).empty() ? "take the element out" : "";
     case oddkind::mismatched:
         return "write </" + printable(odd.other) + ">";
     case oddkind::unclosed:
@@ -231,11 +246,12 @@ std::string cureof(const oddity& odd)
     case oddkind::trailing:
         return "move it before that";
     case oddkind::entity:
-        return odd.name == "&lt;" ? std::string(kIntoAScript) : "write the character itself";
+        return cureofentity(odd.name);
     case oddkind::lessthan:
         return std::string(kIntoAScript);
-    case oddkind::brokentag:
     case oddkind::unfinished:
+        return "a whole file ends with </wdtargets>";
+    case oddkind::brokentag:
         break;
     }
     return "";
@@ -492,7 +508,7 @@ private:
                            (written.monitored ? "service" : "dependent") + " of the file";
             }
         }
-        found.add("missing-field", severity::error, written.begin, std::move(message));
+        found.add("missing-field", severity::error, written.begin, message + "; write it here");
     }
 
     void tellunused(const writtenservice& written, const std::vector<std::size_t>& fields)
@@ -514,6 +530,7 @@ private:
         if (const std::string effect = effectof(written.field, value); !effect.empty()) {
             message += ": " + effect;
         }
+        message += "; " + std::string(cureofempty(written.field));
         const bool used = counts(written.field, in.monitored);
         found.add("empty-field", used ? severity::error : severity::warning, written.begin,
                   std::move(message));
