@@ -150,7 +150,14 @@ int unreadable(const options& chosen, const std::string& reason)
     view.loaded = false;
     const auto sorted = found.sorted();
     if (chosen.json) {
-        std::cout << resultjson(chosen.file, nothing, view, sorted).dump(2) << '\n';
+        auto result = resultjson(chosen.file, nothing, view, sorted);
+        if (chosen.plan) {
+            result["plan"] = planjson({});
+        }
+        if (chosen.probe) {
+            result["probe"] = probejson({});
+        }
+        std::cout << result.dump(2) << '\n';
     } else {
         writefindings(std::cout, chosen.file, nothing, sorted, colourwanted());
     }
