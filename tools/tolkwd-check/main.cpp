@@ -81,6 +81,14 @@ int listrules()
     return 0;
 }
 
+void flushoutput()
+{
+    std::cout.flush();
+    if (!std::cout) {
+        throw std::runtime_error("the output cannot be written");
+    }
+}
+
 // Ends the process where the command line is wrong, or asks for nothing but help.
 options parse(int argc, char** argv)
 {
@@ -116,7 +124,9 @@ options parse(int argc, char** argv)
             throw CLI::RequiredError("FILE");
         }
     } catch (const CLI::ParseError& error) {
-        std::exit(app.exit(error) == 0 ? 0 : kUsageStatus);
+        const bool helped = app.exit(error) == 0;
+        flushoutput();
+        std::exit(helped ? 0 : kUsageStatus);
     }
     return chosen;
 }
@@ -216,10 +226,7 @@ int guarded(const std::function<int()>& work)
 {
     try {
         const int status = work();
-        std::cout.flush();
-        if (!std::cout) {
-            throw std::runtime_error("the output cannot be written");
-        }
+        flushoutput();
         return status;
     } catch (const std::exception& error) {
         (void)std::fprintf(stderr, "tolkwd-check: %s\n", error.what());
