@@ -6,6 +6,7 @@
 #include <utility>
 
 #include "ProcessStatistics_Linux.h"
+#include "fields.h"
 #include "printable.h"
 #include "reason.h"
 #include "surroundings.h"
@@ -196,15 +197,11 @@ std::vector<targetprobe> tryall(const daemonview& view, const surroundings& arou
     return probes;
 }
 
-std::size_t placeof(const targetview& target)
+// The place of a value, or of what watches without having one.
+std::size_t placeof(const targetview& target, field which)
 {
-    for (const std::size_t place :
-         {target.monitored.origins.at(fieldindex("name")).text, target.monitored.begin}) {
-        if (place != kNoPlace) {
-            return place;
-        }
-    }
-    return target.begin;
+    const std::size_t place = check::placeof(target.monitored, which);
+    return place != kNoPlace ? place : target.begin;
 }
 
 std::string answerwords(const commandprobe& tried)
@@ -216,8 +213,9 @@ std::string answerwords(const commandprobe& tried)
            (tried.reason.empty() ? "" : " (" + tried.reason + ")");
 }
 
-void findstatus(const targetprobe& probe, std::size_t place, findings& found)
+void findstatus(const targetview& target, const targetprobe& probe, findings& found)
 {
+    const std::size_t place = placeof(target, &service::name);
     const std::string name = inquotes(probe.name);
     const std::string answer = inquotes(probe.status.command) + ' ' + answerwords(probe.status);
     switch (probe.status.result) {
@@ -242,12 +240,13 @@ void findstatus(const targetprobe& probe, std::size_t place, findings& found)
     }
 }
 
-void findcheck(const targetprobe& probe, std::size_t place, findings& found)
+void findcheck(const targetview& target, const targetprobe& probe, findings& found)
 {
     // Of a service that does not run, no check can work, and the daemon makes none.
     if (!probe.check || probe.status.result != kServiceRunning) {
         return;
     }
+    const std::size_t place = placeof(target, &service::functionalpingcmd);
     const std::string about = " of the service " + inquotes(probe.name) + ' ';
     const std::string answer = answerwords(*probe.check);
     if (probe.check->result == kCommandNotFound) {
@@ -283,7 +282,7 @@ std::string allabove(const processprobe& process)
     return words;
 }
 
-void findprocess(const targetprobe& probe, std::size_t place, findings& found)
+void findprocess(const targetview& target, const targetprobe& probe, findings& found)
 {
     const processprobe& process = probe.process;
     if (!process.counts) {
@@ -291,7 +290,7 @@ void findprocess(const targetprobe& probe, std::size_t place, findings& found)
     }
     const std::string name = inquotes(probe.name);
     if (process.pid == 0 && probe.status.result == kServiceRunning) {
-        found.add("probe-process", severity::warning, place,
+        found.add("probe-process", severity::warning, placeof(target, &service::binarypath),
                   "the service " + name + " runs, but pidof finds no process of " +
                       inquotes(probe.binarypath) +
                       ": the daemon would compare old figures with the thresholds, at first 0: "
@@ -301,7 +300,7 @@ void findprocess(const targetprobe& probe, std::size_t place, findings& found)
         const int skips = Utility::str2int(probe.maxskips);
         const std::string often =
             skips < 0 ? "without end" : "up to " + std::to_string(skips) + " times in a row";
-        found.add("probe-busy", severity::warning, place,
+        found.add("probe-busy", severity::warning, placeof(target, &service::name),
                   "the service " + name + " is above " + allabove(process) +
                       " now: the daemon takes it for busy and would leave its check out, " + often);
     }
@@ -317,10 +316,9 @@ std::vector<targetprobe> probetargets(const daemonview& view, const std::string&
     }
     std::vector<targetprobe> probes = tryall(view, surroundings(folder));
     for (std::size_t i = 0; i < probes.size(); ++i) {
-        const std::size_t place = placeof(view.targets[i]);
-        findstatus(probes[i], place, found);
-        findcheck(probes[i], place, found);
-        findprocess(probes[i], place, found);
+        findstatus(view.targets[i], probes[i], found);
+        findcheck(view.targets[i], probes[i], found);
+        findprocess(view.targets[i], probes[i], found);
     }
     return probes;
 }
