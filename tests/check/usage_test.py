@@ -50,8 +50,8 @@ def test_a_file_that_cannot_be_read_is_not_loaded(program):
 
 def test_an_empty_file_through_a_pipe(program):
     done = answer(program, "--allow", "ping-folder", "--allow", "writable-file", "-")
-    assert (done.returncode, done.stderr) == (1, "")
-    assert done.stdout == "-:1:1: warning: the file is empty: nothing is watched [no-target]\n"
+    assert (done.returncode, done.stderr) == (2, "")
+    assert done.stdout == "-:1:1: error: the file is empty: nothing is watched [no-target]\n"
 
 
 @pytest.mark.parametrize("arguments", [["--help"], ["--version"], ["--rules"],

@@ -1,6 +1,7 @@
 // tolkwd-check: tells what the daemon will make of a configuration, before it does. The command
 // line, and the order of the steps.
 
+#include <algorithm>
 #include <cstdio>
 #include <cstdlib>
 #include <exception>
@@ -9,6 +10,7 @@
 #include <set>
 #include <stdexcept>
 #include <string>
+#include <string_view>
 #include <system_error>
 #include <utility>
 #include <vector>
@@ -63,11 +65,24 @@ bool colourwanted()
     return isatty(STDOUT_FILENO) != 0 && set("NO_COLOR").empty() && set("TERM") != "dumb";
 }
 
+// `text` in lines that a terminal shows whole.
+std::string folded(std::string_view text)
+{
+    constexpr std::size_t kColumns = 80;
+    std::string lines;
+    while (text.size() > kColumns) {
+        const std::size_t end = std::min(text.rfind(' ', kColumns), text.size());
+        lines.append(text.substr(0, end)).append("\n");
+        text.remove_prefix(std::min(end + 1, text.size()));
+    }
+    return lines.append(text);
+}
+
 int explain(const std::string& name)
 {
     const rule& wanted = rulenamed(name);
     std::cout << wanted.name << ": " << wanted.summary << "\n\n"
-              << wanted.explanation << "\n\nwrong:\n"
+              << folded(wanted.explanation) << "\n\nwrong:\n"
               << wanted.wrong << "\n\nright:\n"
               << wanted.right << '\n';
     return 0;

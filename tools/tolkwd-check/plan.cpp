@@ -7,6 +7,7 @@
 #include <unistd.h>
 
 #include "ProcessStatistics_Linux.h"
+#include "fields.h"
 
 namespace check {
 
@@ -36,11 +37,6 @@ plannedtime seconds(long long count) noexcept
     return {.seconds = count};
 }
 
-bool haschecks(const service& svc)
-{
-    return svc.functionalpingcmd != kNoCommand;
-}
-
 plannedtime generalpause(const service& svc)
 {
     return seconds(pauseseconds(settingnumber(svc.genpinginterval)));
@@ -63,7 +59,7 @@ watching stateof(long long attempts)
 plannedtime roundof(const service& svc)
 {
     const plannedtime general = generalpause(svc);
-    return haschecks(svc) ? general + functionalpause(svc) + kOneCheck : general;
+    return ischecked(svc) ? general + functionalpause(svc) + kOneCheck : general;
 }
 
 busyness busynessof(const service& svc, long long skips)
@@ -90,7 +86,7 @@ std::optional<plannedtime> longestunnoticed(const service& svc, long long skips)
 
 std::optional<checkplan> checkof(const service& svc)
 {
-    if (!haschecks(svc)) {
+    if (!ischecked(svc)) {
         return std::nullopt;
     }
     const long long skips = Utility::str2int(svc.MaxFPSkips);

@@ -135,12 +135,6 @@ private:
     bool known = false;
 };
 
-// Whether the daemon ever compares the figures with the thresholds.
-bool figurescount(const service& svc)
-{
-    return !(svc.functionalpingcmd == kNoCommand) && Utility::str2int(svc.MaxFPSkips) != 0;
-}
-
 targetprobe trytarget(const service& svc, progress& shown)
 {
     targetprobe probe{.name = svc.name,
@@ -151,7 +145,7 @@ targetprobe trytarget(const service& svc, progress& shown)
                       .process = {}};
     shown.show("waiting for the status command of " + inquotes(probe.name));
     probe.status = trystatus(svc);
-    if (!(svc.functionalpingcmd == kNoCommand)) {
+    if (ischecked(svc)) {
         shown.show("waiting for the check of " + inquotes(probe.name));
         probe.check = trycheck(svc);
     }
@@ -192,7 +186,7 @@ std::vector<targetprobe> tryall(const daemonview& view, const surroundings& arou
     shown.clear();
     for (std::size_t i = 0; i < probes.size(); ++i) {
         probes[i].process = readings[i].result();
-        probes[i].process.counts = figurescount(*view.targets[i].monitored.record);
+        probes[i].process.counts = looksatthresholds(*view.targets[i].monitored.record);
     }
     return probes;
 }

@@ -287,6 +287,9 @@ public:
 
     void run()
     {
+        if (isnotext()) {
+            return;
+        }
         if (view.loaded) {
             comparetargets();
             for (const writtentarget& written : doc.targets) {
@@ -304,6 +307,21 @@ private:
     [[nodiscard]] std::string line(std::size_t place) const
     {
         return "line " + std::to_string(source.linenumber(place));
+    }
+
+    // Of a file that is no text, nothing else is worth telling.
+    [[nodiscard]] bool isnotext() const
+    {
+        const std::size_t place = source.text().find('\0');
+        if (place == npos) {
+            return false;
+        }
+        found.add("not-text", severity::error, place,
+                  view.targets.empty()
+                      ? "the file holds bytes of value 0, as UTF-16 does and no text in UTF-8: the "
+                        "daemon finds no target in it; save it as UTF-8"
+                      : "a byte of value 0, at which a command or a file's name ends; take it out");
+        return view.targets.empty();
     }
 
     // A target as operators know it.
@@ -583,7 +601,7 @@ private:
     void checktargetcount()
     {
         if (doc.targets.empty() && view.targets.empty()) {
-            found.add("no-target", severity::warning, 0,
+            found.add("no-target", severity::error, 0,
                       source.text().empty() ? "the file is empty: nothing is watched"
                                             : "there is no target: nothing is watched");
         }

@@ -6,11 +6,15 @@ namespace check {
 
 namespace {
 
-constexpr std::array<rule, 22> kRules{{
+constexpr std::array<rule, 23> kRules{{
     {"unreadable-file", "the file cannot be read",
      "The daemon would write one line on standard error, watch nothing, and try again at the next "
      "refresh. Mend the path, or who may read the file.",
      "tolkwd-check tolkwd.xlm", "tolkwd-check tolkwd.xml"},
+    {"not-text", "the file is not in UTF-8, or no text at all",
+     "The daemon reads bytes. In UTF-16, which some editors write, it finds no element that it "
+     "knows, and watches nothing. Save the file as UTF-8, without a byte order mark.",
+     "a file saved as \"Unicode\"", "the same saved as UTF-8"},
     {"declaration", "a declaration that is not at the first byte, or another \"<?\"",
      "The daemon skips one declaration, at the first byte of the file. Blanks before it, a byte "
      "order mark or a second one make it read pieces of the declaration as text or as an element "
