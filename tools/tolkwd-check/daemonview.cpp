@@ -113,7 +113,8 @@ private:
 
     void close(const xmltoken& token)
     {
-        const std::string name = xercecstack.empty() ? "" : xercecstack.top();
+        // An unknown name stays on the stack, so it need not be kept; and it may be very long.
+        const std::string name = opened.empty() || unknown.back() ? "" : xercecstack.top();
         const std::size_t depth = xercecstack.size();
         const std::size_t targets = xmlparser::alltargets.size();
         endElement(std::string(token.content));

@@ -292,7 +292,8 @@ private:
     // The name at the beginning of what is inside a tag, without blanks before it.
     static std::string_view nameof(std::string_view inside)
     {
-        inside = trimmed(inside);
+        const std::string_view blanks(control, kControlCount);
+        inside.remove_prefix(std::min(inside.find_first_not_of(blanks), inside.size()));
         return inside.substr(0, std::min(inside.find_first_of("\n\r\t /=>"), inside.size()));
     }
 
@@ -449,7 +450,7 @@ private:
         case rank::service:
             if (target && service) {
                 service->end = pos;
-                target->services.push_back(std::move(*service));
+                target->add(std::move(*service));
                 service.reset();
             }
             break;
@@ -457,7 +458,7 @@ private:
             field->end = pos;
             field->value = trimmed(meant);
             if (service) {
-                service->fields.push_back(std::move(*field));
+                service->add(std::move(*field));
             }
             field.reset();
             break;
@@ -496,18 +497,29 @@ private:
 
 } // namespace
 
+void writtenservice::add(writtenfield field)
+{
+    last.at(field.field) = fields.size();
+    fields.push_back(std::move(field));
+}
+
 const writtenfield* writtenservice::find(std::size_t field) const noexcept
 {
-    const auto found = std::find_if(fields.rbegin(), fields.rend(),
-                                    [field](const auto& each) { return each.field == field; });
-    return found == fields.rend() ? nullptr : &*found;
+    const auto& place = last[field];
+    return place ? &fields[*place] : nullptr;
+}
+
+void writtentarget::add(writtenservice service)
+{
+    if (service.monitored) {
+        lastmonitored = services.size();
+    }
+    services.push_back(std::move(service));
 }
 
 const writtenservice* writtentarget::monitored() const noexcept
 {
-    const auto found = std::find_if(services.rbegin(), services.rend(),
-                                    [](const auto& each) { return each.monitored; });
-    return found == services.rend() ? nullptr : &*found;
+    return lastmonitored ? &services[*lastmonitored] : nullptr;
 }
 
 document readdocument(std::string_view text)

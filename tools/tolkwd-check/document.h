@@ -3,11 +3,14 @@
 // oddity: whether it does any harm shows when the daemon's own reading is held against this one.
 #pragma once
 
+#include <array>
 #include <cstddef>
 #include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include "wdxmlparserhandler.h"
 
 namespace check {
 
@@ -23,6 +26,10 @@ struct writtenservice {
     std::size_t end = 0;
     bool monitored = false; // else it is a dependent
     std::vector<writtenfield> fields;
+    // Where in `fields` each stands last: a service may have as many as the file has room for.
+    std::array<std::optional<std::size_t>, kFieldElements.size()> last{};
+
+    void add(writtenfield field);
 
     // The field as it is written last, or null.
     [[nodiscard]] const writtenfield* find(std::size_t field) const noexcept;
@@ -32,6 +39,9 @@ struct writtentarget {
     std::size_t begin = 0;
     std::size_t end = 0;
     std::vector<writtenservice> services;
+    std::optional<std::size_t> lastmonitored{}; // in `services`
+
+    void add(writtenservice service);
 
     // The monitored service as it is written last, or null.
     [[nodiscard]] const writtenservice* monitored() const noexcept;

@@ -114,9 +114,6 @@ public:
 
     void run()
     {
-        if (!isown(view, known.which)) {
-            return;
-        }
         if (!counts(*view.record, known)) {
             checkunused();
             return;
@@ -287,7 +284,9 @@ private:
 void checknumbers(const serviceview& view, findings& found)
 {
     for (const numberfield& known : kNumberFields) {
-        numbercheck(view, known, found).run();
+        if (isown(view, known.which)) {
+            numbercheck(view, known, found).run();
+        }
     }
 }
 
