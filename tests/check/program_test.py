@@ -1,10 +1,12 @@
-"""What tolkwd-check does with files that nobody means."""
+"""What tolkwd-check does with command lines, outputs and files that nobody means."""
 
 import subprocess
 
 import pytest
 
 TIME_LIMIT = 60  # seconds
+ESCAPE = "\x1b[31m"
+
 TARGET = "<wdmonitortarget>{}</wdmonitortarget>"
 NAME = "<name>web</name>"
 
@@ -12,6 +14,35 @@ NAME = "<name>web</name>"
 def check(program, *arguments, text="", stdout=subprocess.PIPE):
     return subprocess.run([program, *arguments], input=text, stdout=stdout, stderr=subprocess.PIPE,
                           text=True, encoding="utf-8", timeout=TIME_LIMIT)
+
+
+@pytest.mark.parametrize("arguments", [
+    ["-", ESCAPE], ["--" + ESCAPE], ["-t", ESCAPE, "-"], ["--plan=" + ESCAPE, "-"],
+    ["--explain", ESCAPE], ["--allow", ESCAPE, "-"],
+])
+def test_refused_command_line_does_not_steer_the_terminal(program, arguments):
+    result = check(program, *arguments)
+    assert result.returncode == 64
+    assert "\x1b" not in result.stdout + result.stderr
+    assert "\\x1b[31m" in result.stderr
+
+
+@pytest.mark.parametrize("option", ["--help", "--version", "--rules", "-"])
+def test_output_that_cannot_be_written_is_a_failure(program, option):
+    with open("/dev/full", "w", encoding="utf-8") as full:
+        result = check(program, option, stdout=full)
+    assert result.returncode == 70
+    assert result.stderr == "tolkwd-check: the output cannot be written\n"
+
+
+def test_without_proc_nothing_is_told_about_the_file(program):
+    result = subprocess.run(
+        ["bwrap", "--ro-bind", "/", "/", "--tmpfs", "/proc", "--dev", "/dev", "--", program, "-"],
+        input=f"<wdtargets>{TARGET.format(NAME)}</wdtargets>", stdout=subprocess.PIPE,
+        stderr=subprocess.PIPE, text=True, timeout=TIME_LIMIT)
+    assert result.returncode == 70
+    assert result.stdout == ""
+    assert result.stderr == "tolkwd-check: /proc/self/fd: No such file or directory\n"
 
 
 def monitored(fields):

@@ -33,6 +33,11 @@ public:
             }
             text.remove_prefix(static_cast<std::size_t>(written));
         }
+        if (access(path().c_str(), R_OK) != 0) {
+            const int reason = errno;
+            close(fd);
+            throw std::system_error(reason, std::generic_category(), "/proc/self/fd");
+        }
     }
     ~memoryfile() { close(fd); }
     memoryfile(const memoryfile&) = delete;

@@ -96,12 +96,20 @@ int listrules()
     return 0;
 }
 
-void flushoutput()
+// The exit status, once all that was written has been taken.
+int delivered(int status)
 {
     std::cout.flush();
     if (!std::cout) {
         throw std::runtime_error("the output cannot be written");
     }
+    return status;
+}
+
+// Of a word on the command line that it does not understand, CLI11 repeats every byte.
+std::string refusal(const CLI::App* /*app*/, const CLI::Error& error)
+{
+    return printable(error.what()) + "\nRun with --help for more information.\n";
 }
 
 // Ends the process where the command line is wrong, or asks for nothing but help.
@@ -133,15 +141,14 @@ options parse(int argc, char** argv)
         ->check(arule);
     app.add_flag("--rules", chosen.listrules, "List all rules");
     app.set_version_flag("--version", "tolkwd-check " TOLKWD_VERSION);
+    app.failure_message(refusal);
     try {
         app.parse(argc, argv);
         if (chosen.file.empty() && chosen.explained.empty() && !chosen.listrules) {
             throw CLI::RequiredError("FILE");
         }
     } catch (const CLI::ParseError& error) {
-        const bool helped = app.exit(error) == 0;
-        flushoutput();
-        std::exit(helped ? 0 : kUsageStatus);
+        std::exit(app.exit(error) == 0 ? delivered(0) : kUsageStatus);
     }
     return chosen;
 }
@@ -240,9 +247,7 @@ int checkfile(const options& chosen, const sourcetext& source, const std::string
 int guarded(const std::function<int()>& work)
 {
     try {
-        const int status = work();
-        flushoutput();
-        return status;
+        return delivered(work());
     } catch (const std::exception& error) {
         (void)std::fprintf(stderr, "tolkwd-check: %s\n", error.what());
         return kFailureStatus;
