@@ -68,7 +68,8 @@ class Sandbox:
         """The command line that runs these lines of shell in the sandbox."""
         return [PROJECT / "scripts" / "sandbox.sh", "--bind", self.stage, "/opt/stage",
                 "--ro-bind", self.program, "/opt/program/tolkwd-check",
-                "--setenv", "PATH", "/opt/stage/bin:/opt/program:/usr/sbin:/usr/bin:/sbin:/bin",
+                "--ro-bind", self.stage / "bin", "/usr/local/sbin",
+                "--setenv", "PATH", "/opt/program:/usr/local/sbin:/usr/sbin:/usr/bin:/sbin:/bin",
                 "--", "/bin/bash", "-c",
                 "mkdir -p /opt/varden/tolk/bin\n" + ALONE + shell + "\nstatus=$?\n"
                 "find /tmp /opt/varden/tolk/bin ! -type d >/opt/stage/left\n"
@@ -283,3 +284,17 @@ def test_a_terminal_shows_what_is_waited_for(sandbox):
     assert '\rwaiting for the status command of "web"' in shown
     assert '\rwaiting for the check of "web"' in shown
     assert shown.split("\r")[-2].strip() == ""  # nothing of it is left
+
+
+def test_programs_are_looked_for_where_the_daemon_looks(sandbox):
+    sandbox.service("web", "echo web is running")
+    check = sandbox.stage / "own" / "check-web"
+    check.parent.mkdir()
+    check.write_text("#!/bin/sh\necho service: ok\n")
+    check.chmod(0o755)
+    sandbox.configure({"name": "web", "functionalpingcmd": "check-web"})
+    command = sandbox.command(f"PATH=/opt/stage/own:/opt/program:/bin tolkwd-check {PROBE}")
+    result = subprocess.run(command, capture_output=True, timeout=LIMIT_SECONDS)
+    report = result.stdout.decode()
+    assert "status     running: " in report
+    assert "check-web: not found" in report

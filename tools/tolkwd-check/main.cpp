@@ -20,6 +20,7 @@
 #include <CLI/CLI.hpp>
 
 #include "daemonview.h"
+#include "files.h"
 #include "finding.h"
 #include "interrupt.h"
 #include "json.h"
@@ -210,6 +211,8 @@ int checkfile(const options& chosen, const sourcetext& source, const std::string
     checkmachine(chosen.file, view, found);
     std::vector<targetprobe> probes;
     if (chosen.probe) {
+        // The caller's may lack sbin, or hold programs that the daemon does not find.
+        setenv("PATH", std::string(kDaemonPath).c_str(), 1);
         probes = probetargets(view, folder, found);
     }
     checkload(view, durationsof(probes), found);
