@@ -44,6 +44,20 @@ void checkspelling(const serviceview& view, field which, findings& found)
     }
 }
 
+void checkend(const serviceview& view, field which, findings& found)
+{
+    const std::string& command = view.record->*which;
+    if (!isown(view, which) || command.find('\0') == std::string::npos) {
+        return;
+    }
+    found.add("nul-byte", severity::error, placeof(view, which),
+              valueof(view, which) + ", of which the shell gets only what stands before \\x00" +
+                  (which == &service::functionalpingcmd
+                       ? ", and nothing of the redirection behind it: its answer is not read"
+                       : "") +
+                  "; take that byte out");
+}
+
 void checkmonitoredempty(const serviceview& view, findings& found)
 {
     const service& record = *view.record;
@@ -150,9 +164,12 @@ void checkcommands(const serviceview& view, bool monitored, findings& found)
 {
     checkspelling(view, &service::startcmd, found);
     checkspelling(view, &service::stopcmd, found);
+    checkend(view, &service::startcmd, found);
+    checkend(view, &service::stopcmd, found);
     checkbounds(view, monitored, found);
     if (monitored) {
         checkspelling(view, &service::functionalpingcmd, found);
+        checkend(view, &service::functionalpingcmd, found);
         checkmonitoredempty(view, found);
         checkanswer(view, found);
     } else {

@@ -420,7 +420,7 @@ private:
 
 shelltext splitshell(std::string_view text)
 {
-    return reader().run(text);
+    return reader().run(text.substr(0, text.find('\0'))); // as much of it as the shell gets
 }
 
 } // namespace check

@@ -6,7 +6,7 @@ namespace check {
 
 namespace {
 
-constexpr std::array<rule, 21> kRules{{
+constexpr std::array<rule, 22> kRules{{
     {"attempts-negative",
      "a negative number of recoveries: nothing is asked, a processor is kept busy",
      "With a negative maxattemptofwakeup the monitor asks nothing, gives nothing up, and "
@@ -84,15 +84,21 @@ constexpr std::array<rule, 21> kRules{{
      "60s is 60, 1.5 is 1, 0x10 is 0. Text that begins with something else is 0. Neither "
      "is reported. Write digits only.",
      "<genpinginterval>1m</genpinginterval>", "<genpinginterval>60</genpinginterval>"},
+    {"nul-byte", "a command with a byte of value 0, which ends it",
+     "The shell gets a command up to its first byte of value 0. A check loses what the daemon "
+     "appends to it, too, 1>FILE 2>FILE: what it prints is not read. Such a byte is shown as "
+     "\\x00. Take it out.",
+     "<startcmd>service web\\x00 start</startcmd>", "<startcmd>service web start</startcmd>"},
     {"null-spelling", "a spelling of NULL that is run as a command",
      "Only the four letters NULL mean that there is no command of one's own. \"null\", "
      "\"none\" or \"-\" is handed to the shell, which knows no such program: the service "
      "is not started or not stopped, and a check of that kind fails for ever. Write NULL.",
      "<stopcmd>none</stopcmd>", "<stopcmd>NULL</stopcmd>"},
     {"number-range", "a number that is too large",
-     "A limit or a threshold beyond 2147483647 becomes that number, and an interval beyond "
-     "4294967295 seconds becomes that long a pause, in which nothing is asked. Write the "
-     "number that is meant.",
+     "MaxFPSkips or a threshold beyond 2147483647 becomes that number, and an interval beyond "
+     "4294967295 seconds becomes that long a pause, in which nothing is asked. So many "
+     "recoveries as a maxattemptofwakeup beyond 2147483647 allows are never used up. Write "
+     "the number that is meant.",
      "<genpinginterval>60000000000</genpinginterval>", "<genpinginterval>60</genpinginterval>"},
     {"service-name", "a name that the shell or the file system takes otherwise",
      "The name stands in `service NAME status`, which the shell runs as root, and in the "
