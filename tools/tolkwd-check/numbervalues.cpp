@@ -152,6 +152,11 @@ private:
 
     void checkrange()
     {
+        if (known.kind == meaning::kAttempts) {
+            add("number-range", severity::warning,
+                ", which is so large a number that the service is never given up");
+            return;
+        }
         std::string becomes = std::to_string(number);
         if (known.kind == meaning::kPause) {
             const unsigned pause = pauseseconds(number);
