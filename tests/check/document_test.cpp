@@ -30,10 +30,11 @@ std::string valueof(const std::string& fields)
 
 std::string kinds(const std::string& fields)
 {
-    constexpr std::array<const char*, 18> kNames{
-        "comment",  "cdata",     "doctype",   "instruction", "attribute",  "entity",
-        "emptytag", "unknown",   "lessthan",  "brokentag",   "mismatched", "strayclosing",
-        "unclosed", "misplaced", "lostfield", "straytext",   "trailing",   "unfinished"};
+    constexpr std::array<const char*, 19> kNames{
+        "comment",    "cdata",        "doctype",     "instruction", "attribute",
+        "entity",     "emptytag",     "unknown",     "lessthan",    "brokentag",
+        "mismatched", "strayclosing", "lateclosing", "unclosed",    "misplaced",
+        "lostfield",  "straytext",    "trailing",    "unfinished"};
     std::string list;
     const std::string text = kOpen + fields + kClose;
     for (const oddity& odd : readdocument(text).oddities) {
@@ -86,6 +87,31 @@ TEST(Document, OddThingsAreNoted)
     EXPECT_EQ(kinds("</wdmonitorservice></wdmonitortarget><wdmondependsev></wdmondependsev>"
                     "<wdmonitortarget><wdmonitorservice>"),
               "misplaced");
+}
+
+TEST(Document, WhatStandsInsideTheWrongElementDoesNotMoveTheRest)
+{
+    const std::string inside = "<wdmondependsev><name>b</name></wdmondependsev>";
+    EXPECT_EQ(kinds("<name>a</name>" + inside), "unclosed lateclosing");
+    EXPECT_EQ(kinds("<wdmonitorservice><name>a</name></wdmonitorservice>"), "unclosed lateclosing");
+    const document nested = readdocument("<wdtargets><wdmonitortarget><wdmonitortarget>"
+                                         "</wdmonitortarget></wdmonitortarget></wdtargets>");
+    EXPECT_TRUE(nested.rootend);
+    EXPECT_EQ(nested.targets.size(), 2U);
+}
+
+TEST(Document, ClosingTagsOfInnerElementsCloseNothingThatGoesOn)
+{
+    const std::string target = "<wdmonitortarget></wdmonitortarget>";
+    const document doubled =
+        readdocument("<wdtargets>" + target + "</wdmonitortarget>" + target + "</wdtargets>");
+    ASSERT_EQ(doubled.oddities.size(), 1U);
+    EXPECT_EQ(doubled.oddities[0].kind, oddkind::strayclosing);
+    EXPECT_TRUE(doubled.rootend);
+    const document misspelt = readdocument("<wdtargets>" + target + "</wdmonitortarget>");
+    ASSERT_EQ(misspelt.oddities.size(), 1U);
+    EXPECT_EQ(misspelt.oddities[0].kind, oddkind::mismatched);
+    EXPECT_EQ(kinds("</wdmonitorservice></wdmonitorservice><wdmonitorservice>"), "strayclosing");
 }
 
 TEST(Document, EndIsTold)

@@ -32,6 +32,12 @@ bool beginsname(char c)
 
 // What kind of element a name is. Ours have their rank: nothing is inside one of its own rank.
 enum class rank { root, target, service, field, unknown };
+constexpr std::size_t kRanks = 5;
+
+std::size_t indexof(rank level)
+{
+    return static_cast<std::size_t>(level);
+}
 
 rank rankof(std::string_view name)
 {
@@ -389,8 +395,19 @@ private:
             return stack[index].level >= level;
         });
         if (first != known.end()) {
+            ++endedearly.at(indexof(stack[*first].level));
             closedown(*first);
         }
+    }
+
+    // Whether this closing tag belongs to an element that was taken to have ended where another one
+    // began. Inside one of the same rank it is rather that one's, and misspelt.
+    bool comeslate(rank level)
+    {
+        std::size_t& early = endedearly.at(indexof(level));
+        const bool late = early > 0 && stack.back().level < level;
+        early -= late ? 1 : 0;
+        return late;
     }
 
     void closedown(std::size_t kept)
@@ -402,6 +419,28 @@ private:
             }
             close();
         }
+    }
+
+    // Whether a closing tag of another name may be the misspelt one of the element that is open:
+    // not if it names what stands inside that, and the element goes on behind it.
+    [[nodiscard]] bool ismeantforopen(rank level) const
+    {
+        if (infield() || inunknown() || level == rank::unknown || level <= stack.back().level) {
+            return true;
+        }
+        return level != rank::field && !goeson();
+    }
+
+    // Whether the next tag is one of the element that is open, its own closing tag or the beginning
+    // of something that belongs inside it.
+    [[nodiscard]] bool goeson() const
+    {
+        const std::string_view rest = text.substr(std::min(text.find('<', pos), text.size()));
+        if (rest.starts_with("</")) {
+            return nameof(rest.substr(2)) == stack.back().name;
+        }
+        return !rest.empty() &&
+               indexof(rankof(nameof(rest.substr(1)))) == indexof(stack.back().level) + 1;
     }
 
     void readclosing(std::size_t begin, std::string_view inside, std::string_view name)
@@ -421,7 +460,9 @@ private:
                 result.rootclosing = inside;
             }
             close();
-        } else if (infield() || rankof(name) != rank::field || inunknown()) {
+        } else if (comeslate(rankof(name))) {
+            note(oddkind::lateclosing, begin, pos, name);
+        } else if (ismeantforopen(rankof(name))) {
             note(oddkind::mismatched, begin, pos, name, stack.back().name);
             close();
         } else {
@@ -437,6 +478,7 @@ private:
         --openof[closed.name];
         if (closed.level != rank::unknown) {
             known.pop_back();
+            std::fill(endedearly.begin() + indexof(closed.level) + 1, endedearly.end(), 0);
         }
         switch (closed.level) {
         case rank::root:
@@ -488,6 +530,7 @@ private:
     std::vector<std::size_t> known; // where ours are on the stack: one of each rank at most
     std::unordered_map<std::string_view, std::size_t> openof; // how many of a name are open
     std::unordered_map<std::string_view, std::size_t> missing;
+    std::array<std::size_t, kRanks> endedearly{}; // how many of a rank, in what is open
     std::optional<writtentarget> target;
     std::optional<writtenservice> service;
     std::optional<writtenfield> field;

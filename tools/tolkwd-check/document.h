@@ -60,6 +60,7 @@ enum class oddkind {
     brokentag,    // a tag of ours without its ">"
     mismatched,   // a closing tag of another name
     strayclosing, // a closing tag of nothing that is open
+    lateclosing,  // the closing tag of an element around others of ours that may not stand in it
     unclosed,     // an element of ours that is never closed
     misplaced,    // a group of ours where it does not belong
     lostfield,    // a field outside a service

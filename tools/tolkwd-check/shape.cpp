@@ -73,6 +73,7 @@ telling tellingof(oddkind kind)
         return {"mismatched-tag", severity::error};
     case oddkind::mismatched:
     case oddkind::strayclosing:
+    case oddkind::lateclosing:
     case oddkind::unclosed:
         return {"mismatched-tag", severity::warning};
     case oddkind::misplaced:
@@ -181,6 +182,8 @@ std::string tell(const oddity& odd, std::string_view text)
                inquotes(odd.name);
     case oddkind::strayclosing:
         return inquotes(odd.name) + " is not open here: this closes what is open";
+    case oddkind::lateclosing:
+        return inquotes(odd.name) + " closes here what had to end before another one began";
     case oddkind::unclosed:
         return tag(odd.name) + " is not closed";
     case oddkind::misplaced:
@@ -235,6 +238,8 @@ std::string cureof(const oddity& odd)
         return "write NULL for no command, or a number";
     case oddkind::unknown:
         return similar(odd.name).empty() ? "take the element out" : "";
+    case oddkind::lateclosing:
+        return "move it there";
     case oddkind::mismatched:
         return "write </" + printable(odd.other) + ">";
     case oddkind::unclosed:
