@@ -1,5 +1,6 @@
 """What tolkwd-check does with command lines, outputs and files that nobody means."""
 
+import json
 import subprocess
 
 import pytest
@@ -43,6 +44,14 @@ def test_without_proc_nothing_is_told_about_the_file(program):
     assert result.returncode == 70
     assert result.stdout == ""
     assert result.stderr == "tolkwd-check: /proc/self/fd: No such file or directory\n"
+
+
+def test_parts_asked_for_are_there_without_a_file(program):
+    result = check(program, "--json", "--plan", "--probe", "/no/such/file")
+    assert result.returncode == 2
+    parts = json.loads(result.stdout)
+    assert parts["findings"][0]["rule"] == "unreadable-file"
+    assert parts["plan"] == parts["probe"] == []
 
 
 def monitored(fields):

@@ -174,6 +174,18 @@ bool probeconfirmed(const options& chosen, const daemonview& view)
     return answer == "y" || answer == "yes";
 }
 
+// What was asked for besides the findings.
+void addparts(nlohmann::ordered_json& result, const options& chosen,
+              const std::vector<targetplan>& plan, const std::vector<targetprobe>& probes)
+{
+    if (chosen.plan) {
+        result["plan"] = planjson(plan);
+    }
+    if (chosen.probe) {
+        result["probe"] = probejson(probes);
+    }
+}
+
 int unreadable(const options& chosen, const std::string& reason)
 {
     findings found(chosen.allowed);
@@ -184,12 +196,7 @@ int unreadable(const options& chosen, const std::string& reason)
     const auto sorted = found.sorted();
     if (chosen.json) {
         auto result = resultjson(chosen.file, nothing, view, sorted);
-        if (chosen.plan) {
-            result["plan"] = planjson({});
-        }
-        if (chosen.probe) {
-            result["probe"] = probejson({});
-        }
+        addparts(result, chosen, {}, {});
         std::cout << result.dump(2) << '\n';
     } else {
         writefindings(std::cout, chosen.file, nothing, sorted, colourwanted());
@@ -219,14 +226,10 @@ int checkfile(const options& chosen, const sourcetext& source, const std::string
     const auto sorted = found.sorted();
     const int refresh =
         chosen.refresh < kLeastRefreshSeconds ? kDefaultRefreshSeconds : chosen.refresh;
+    const auto plan = chosen.plan ? makeplan(view, refresh) : std::vector<targetplan>();
     if (chosen.json) {
         auto result = resultjson(chosen.file, source, view, sorted);
-        if (chosen.plan) {
-            result["plan"] = planjson(makeplan(view, refresh));
-        }
-        if (chosen.probe) {
-            result["probe"] = probejson(probes);
-        }
+        addparts(result, chosen, plan, probes);
         std::cout << result.dump(2) << '\n';
     } else {
         const bool colour = colourwanted();
@@ -235,7 +238,7 @@ int checkfile(const options& chosen, const sourcetext& source, const std::string
         bool written = !sorted.empty();
         if (chosen.plan) {
             std::cout << (written ? "\n" : "");
-            writeplan(std::cout, makeplan(view, refresh), colour);
+            writeplan(std::cout, plan, colour);
             written = true;
         }
         if (!probes.empty()) {
