@@ -94,6 +94,7 @@ TEST_F(Files, TellScripts)
 TEST_F(Files, KnowNoServiceOfAnInventedName)
 {
     EXPECT_FALSE(files.isservice("no-such-service"));
+    EXPECT_FALSE(files.isservice(".."));
     EXPECT_FALSE(files.isservice("no-such-service@1"));
 }
 

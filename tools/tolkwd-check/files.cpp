@@ -147,6 +147,9 @@ void machinefiles::listfolder(const std::string& folder, bool units)
     }
     while (const dirent* const entry = readdir(listing.get())) {
         std::string name = &entry->d_name[0];
+        if (name == "." || name == "..") {
+            continue;
+        }
         if (!units) {
             services.insert(std::move(name));
         } else if (name.ends_with(kUnitSuffix)) {

@@ -190,7 +190,7 @@ private:
             return; // where it is, `cd` may have decided
         }
         const std::string& file = named.argument ? named.name : files.program(named.name);
-        if (file.empty()) {
+        if (file.empty() || (named.argument && files.of(file).found == presence::kMissing)) {
             if (needed) {
                 missing(view, which, named);
             }

@@ -265,7 +265,7 @@ private:
         if (number <= kPercentAtMost) {
             add("threshold-unit", severity::warning,
                 ", and counts pages, not per cent: " + std::to_string(number * page / 1024) +
-                    " KiB, which every process has; 1 GiB would be " +
+                    " KiB, which most processes have; 1 GiB would be " +
                     std::to_string((kMebibyte << 10) / page));
         } else if (number * page >= kTebibyte && number % kMebibyte == 0) {
             add("threshold-unit", severity::warning,
