@@ -298,3 +298,19 @@ def test_programs_are_looked_for_where_the_daemon_looks(sandbox):
     report = result.stdout.decode()
     assert "status     running: " in report
     assert "check-web: not found" in report
+
+
+@pytest.mark.parametrize("target", [
+    {"name": "web stop"},
+    {"name": "web status; touch /opt/stage/started;"},
+    {"name": "web", "binarypath": "x; touch /opt/stage/started"},
+    {"name": "web", "binarypath": "$(touch /opt/stage/started)"},
+])
+def test_nothing_is_run_where_the_shell_would_run_something_else(sandbox, target):
+    sandbox.configure({"name": "db", "MaxFPSkips": "5"}, target)
+    result = sandbox.run(PROBE)
+    assert result.returncode == 64
+    assert b" would have the shell run something else than " in result.stderr
+    assert result.stderr.endswith(b"nothing was run\n")
+    assert sandbox.calls() == []
+    assert sandbox.untouched()

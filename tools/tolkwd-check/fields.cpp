@@ -98,4 +98,14 @@ bool isplainname(std::string_view name) noexcept
     return !name.empty() && name.front() != '-' && std::all_of(name.begin(), name.end(), isplain);
 }
 
+bool isplainpath(std::string_view path) noexcept
+{
+    return std::all_of(path.begin(), path.end(), [](char letter) {
+        return (letter >= 'a' && letter <= 'z') || (letter >= 'A' && letter <= 'Z') ||
+               (letter >= '0' && letter <= '9') ||
+               std::string_view("/._@:+,=%-").find(letter) != std::string_view::npos ||
+               (static_cast<unsigned char>(letter) & 0x80U) != 0;
+    });
+}
+
 } // namespace check

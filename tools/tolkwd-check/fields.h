@@ -43,4 +43,7 @@ bool isnullspelling(std::string_view command);
 // Whether the name is one that the shell and the folder of the pings take as it stands. Any thread.
 bool isplainname(std::string_view name) noexcept;
 
+// Whether the shell takes the path as it stands. Any thread.
+bool isplainpath(std::string_view path) noexcept;
+
 } // namespace check

@@ -19,16 +19,6 @@ namespace check {
 
 namespace {
 
-bool isplainpath(std::string_view path)
-{
-    return std::all_of(path.begin(), path.end(), [](char letter) {
-        return (letter >= 'a' && letter <= 'z') || (letter >= 'A' && letter <= 'Z') ||
-               (letter >= '0' && letter <= '9') ||
-               std::string_view("/._@:+,=%-").find(letter) != std::string_view::npos ||
-               (static_cast<unsigned char>(letter) & 0x80U) != 0;
-    });
-}
-
 class machinecheck {
 public:
     machinecheck(const std::string& file, findings& collected) : path(file), found(collected) {}

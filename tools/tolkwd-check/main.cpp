@@ -158,6 +158,10 @@ options parse(int argc, char** argv)
 // read from standard input cannot be followed by an answer.
 bool probeconfirmed(const options& chosen, const daemonview& view)
 {
+    if (const auto obstacle = probeobstacle(view)) {
+        std::cerr << *obstacle << '\n';
+        return false;
+    }
     const auto question = probequestion(view);
     if (chosen.yes || !question) {
         return true;

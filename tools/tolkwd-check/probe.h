@@ -61,6 +61,10 @@ struct targetprobe {
 // where it would run nothing. One thread.
 std::optional<std::string> probequestion(const daemonview& view);
 
+// Why these targets cannot be probed: with such a name or binarypath the shell would run something
+// else than a status command or pidof, as in "web stop". Nothing where they can. One thread.
+std::optional<std::string> probeobstacle(const daemonview& view);
+
 // Runs what has to be run, one after the other, for as long as it takes, and adds to `found` what
 // it shows. Gives as many results as there are targets, or none where the file does not load. The
 // main thread only, without others: meanwhile the surroundings of the process are those of the

@@ -6,6 +6,7 @@
 #include <pwd.h>
 #include <unistd.h>
 
+#include "fields.h"
 #include "printable.h"
 #include "wdmonitorthread_linux.h"
 
@@ -198,6 +199,24 @@ std::optional<std::string> probequestion(const daemonview& view)
            counted(targets, "status command") + ", " + counted(checks, "check") +
            "), and pidof for " + counted(targets, "program") +
            (geteuid() == 0 ? "" : "; the daemon runs them as root") + ". Go on? [y/N] ";
+}
+
+std::optional<std::string> probeobstacle(const daemonview& view)
+{
+    constexpr std::string_view kOtherwise = " would have the shell run something else than ";
+    for (const targetview& target : view.targets) {
+        const std::string& name = target.monitored.record->name;
+        if (!name.empty() && !isplainname(name)) {
+            return "the name " + inquotes(name) + std::string(kOtherwise) + "its status command";
+        }
+        // A blank only makes two names of it.
+        std::string path = target.monitored.record->binarypath;
+        std::erase(path, ' ');
+        if (!isplainpath(path)) {
+            return "the binarypath of " + inquotes(name) + std::string(kOtherwise) + "pidof";
+        }
+    }
+    return std::nullopt;
 }
 
 void writeprobe(std::ostream& out, const std::vector<targetprobe>& probes, bool colour)
