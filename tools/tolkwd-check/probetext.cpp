@@ -192,7 +192,7 @@ std::optional<std::string> probequestion(const daemonview& view)
     }
     std::size_t checks = 0;
     for (const targetview& target : view.targets) {
-        checks += target.monitored.record->functionalpingcmd == kNoCommand ? 0 : 1;
+        checks += ischecked(*target.monitored.record) ? 1 : 0;
     }
     const std::size_t targets = view.targets.size();
     return "This runs " + counted(targets + checks, "command") + " as " + username() + " (" +
