@@ -318,15 +318,13 @@ private:
     [[nodiscard]] bool isnotext() const
     {
         const std::size_t place = source.text().find('\0');
-        if (place == npos) {
+        if (place == npos || !view.targets.empty()) {
             return false;
         }
         found.add("not-text", severity::error, place,
-                  view.targets.empty()
-                      ? "the file holds bytes of value 0, as UTF-16 does and no text in UTF-8: the "
-                        "daemon finds no target in it; save it as UTF-8"
-                      : "a byte of value 0, at which a command or a file's name ends; take it out");
-        return view.targets.empty();
+                  "the file holds bytes of value 0, as UTF-16 does and no text in UTF-8: the "
+                  "daemon finds no target in it; save it as UTF-8");
+        return true;
     }
 
     // A target as operators know it.
