@@ -379,7 +379,9 @@ TEST_F(Probe, AsksHowManyCommandsItMayRun)
 {
     view = readasdaemon(configuration({{}, {.check = "echo service: ok"}}));
     const std::string question = probequestion(view).value();
-    EXPECT_TRUE(question.starts_with("This runs 3 commands as ")) << question;
+    EXPECT_TRUE(
+        question.starts_with("The checks:\n  \"echo service: ok\"\nThis runs 3 commands as "))
+        << question;
     EXPECT_NE(question.find("(2 status commands, 1 check), and pidof for 2 programs"),
               std::string::npos)
         << question;

@@ -158,6 +158,7 @@ def test_nothing_is_run_unless_the_answer_is_yes(sandbox, answer):
     assert played.returncode == 64
     assert played.stdout == b""
     assert played.stderr == (
+        b'The checks:\n  "touch /opt/stage/started"\n'
         b"This runs 2 commands as root (1 status command, 1 check), and pidof for 1 program. "
         b"Go on? [y/N] \nnothing was run\n")
     assert sandbox.calls() == []

@@ -84,7 +84,7 @@ TEST(Report, IsColouredWhereThatIsWanted)
 
 TEST(Report, ShowsAThousandOfARuleAndCountsTheRest)
 {
-    std::vector<finding> found(1003, {kNoPlace, severity::note, "comment", "what"});
+    std::vector<finding> found(1003, {0, severity::note, "comment", "what"});
     found.push_back({kNoPlace, severity::note, "entity", "other"});
     const std::string text = shown("", found);
     EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 1002);
@@ -100,6 +100,21 @@ TEST(Report, StatusIsThatOfTheGravestFinding)
               1);
     EXPECT_EQ(statusof({{0, severity::error, "comment", ""}, {0, severity::note, "entity", ""}}),
               2);
+}
+
+TEST(Findings, AreCountedWhereThereAreTooMany)
+{
+    constexpr std::size_t kKept = 100000;
+    findings found;
+    for (std::size_t i = 0; i < kKept + 7; ++i) {
+        found.add("comment", severity::note, i, "what");
+    }
+    found.add("comment", severity::error, 3, "grave");
+    const auto sorted = found.sorted();
+    ASSERT_EQ(sorted.size(), kKept + 2);
+    EXPECT_EQ(sorted.back().message, "7 more are not kept");
+    EXPECT_EQ(sorted.back().level, severity::note);
+    EXPECT_EQ(statusof(sorted), 2);
 }
 
 TEST(Findings, AreSortedAndToldOnce)

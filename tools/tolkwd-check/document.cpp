@@ -14,6 +14,10 @@ namespace check {
 namespace {
 
 constexpr std::size_t npos = std::string_view::npos;
+constexpr std::size_t kOddKinds = static_cast<std::size_t>(oddkind::unfinished) + 1;
+
+// What more of a kind there is, a file of nothing but mistakes, is not worth its memory.
+constexpr std::size_t kMostOfAKind = 200000;
 
 std::string_view trimmed(std::string_view text)
 {
@@ -132,7 +136,9 @@ private:
     void note(oddkind kind, std::size_t begin, std::size_t end, std::string_view name = {},
               std::string_view other = {})
     {
-        result.oddities.push_back({kind, begin, end, name, other});
+        if (++noted.at(static_cast<std::size_t>(kind)) <= kMostOfAKind) {
+            result.oddities.push_back({kind, begin, end, name, other});
+        }
     }
 
     [[nodiscard]] bool rootclosed() const { return result.rootend && stack.empty(); }
@@ -535,6 +541,7 @@ private:
     std::optional<writtenservice> service;
     std::optional<writtenfield> field;
     std::string meant;
+    std::array<std::size_t, kOddKinds> noted{}; // of each kind
     document result;
 };
 

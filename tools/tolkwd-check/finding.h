@@ -2,9 +2,11 @@
 #pragma once
 
 #include <cstddef>
+#include <map>
 #include <set>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace check {
@@ -29,7 +31,8 @@ public:
     explicit findings(std::set<std::string, std::less<>> allowed);
 
     // Takes a finding of `rule`, which has to be one of rules.h. The same one at the same place is
-    // taken once.
+    // taken once. Of one rule and severity the first hundred thousand are kept and the rest
+    // counted: a file of nothing but mistakes must not take all memory.
     void add(std::string_view rule, severity level, std::size_t place, std::string message);
 
     // All of them by their place in the file, and at one place the graver ones first; those
@@ -37,8 +40,11 @@ public:
     [[nodiscard]] std::vector<finding> sorted() const;
 
 private:
+    static constexpr std::size_t kMostOfARule = 100000;
+
     std::set<std::string, std::less<>> left;
     std::vector<finding> all;
+    std::map<std::pair<std::string_view, severity>, std::size_t> counts;
 };
 
 } // namespace check

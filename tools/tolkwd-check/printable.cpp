@@ -8,7 +8,7 @@ namespace check {
 
 namespace {
 
-constexpr std::size_t kQuotedCharacters = 60;
+constexpr std::size_t kBriefCharacters = 60;
 
 struct character {
     char32_t code;      // meaningless where it is not valid
@@ -94,9 +94,14 @@ std::string printable(std::string_view text)
     return shown(text, true, static_cast<std::size_t>(-1));
 }
 
+std::string brief(std::string_view text)
+{
+    return shown(text, false, kBriefCharacters);
+}
+
 std::string inquotes(std::string_view text)
 {
-    return '"' + shown(text, false, kQuotedCharacters) + '"';
+    return '"' + brief(text) + '"';
 }
 
 std::size_t characters(std::string_view text) noexcept

@@ -12,8 +12,11 @@ namespace check {
 // below it in line; all else is one line. Any thread.
 std::string printable(std::string_view text);
 
-// The same without the tab, and in quotes for a message: `text` of more than 60 characters is cut
-// and ends in "...". Any thread.
+// The same without the tab, for a message: `text` of more than 60 characters is cut and ends in
+// "...". Any thread.
+std::string brief(std::string_view text);
+
+// The same in quotes. Any thread.
 std::string inquotes(std::string_view text);
 
 // How many characters `text` has; a byte that is not UTF-8 counts as one. Any thread.

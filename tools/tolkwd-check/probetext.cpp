@@ -185,17 +185,27 @@ std::string counted(std::size_t count, const std::string& one)
 
 } // namespace
 
+// Whoever has more of them than a screen holds looks into the file.
+constexpr std::size_t kShownChecks = 20;
+
 std::optional<std::string> probequestion(const daemonview& view)
 {
     if (!view.loaded || view.targets.empty()) {
         return std::nullopt;
     }
     std::size_t checks = 0;
+    std::string commands;
     for (const targetview& target : view.targets) {
-        checks += ischecked(*target.monitored.record) ? 1 : 0;
+        if (ischecked(*target.monitored.record) && ++checks <= kShownChecks) {
+            commands += "  " + inquotes(target.monitored.record->functionalpingcmd.str()) + '\n';
+        }
+    }
+    if (checks > kShownChecks) {
+        commands += "  and " + std::to_string(checks - kShownChecks) + " more\n";
     }
     const std::size_t targets = view.targets.size();
-    return "This runs " + counted(targets + checks, "command") + " as " + username() + " (" +
+    return (checks > 0 ? "The checks:\n" : "") + commands + "This runs " +
+           counted(targets + checks, "command") + " as " + username() + " (" +
            counted(targets, "status command") + ", " + counted(checks, "check") +
            "), and pidof for " + counted(targets, "program") +
            (geteuid() == 0 ? "" : "; the daemon runs them as root") + ". Go on? [y/N] ";

@@ -111,7 +111,7 @@ void writefindings(std::ostream& out, const std::string& name, const sourcetext&
     const std::string file = printable(name);
     std::map<std::string_view, std::size_t> count;
     for (const finding& each : found) {
-        if (++count[each.rule] <= kShownOfARule) {
+        if (each.place == kNoPlace || ++count[each.rule] <= kShownOfARule) {
             writefinding(out, file, source, each, colour);
         }
     }

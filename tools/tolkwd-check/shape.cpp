@@ -178,7 +178,7 @@ std::string tell(const oddity& odd, std::string_view text)
     case oddkind::brokentag:
         return "the \">\" of this tag is missing";
     case oddkind::mismatched:
-        return "this closes " + tag(printable(odd.other)) + ", though it is named " +
+        return "this closes " + tag(brief(odd.other)) + ", though it is named " +
                inquotes(odd.name);
     case oddkind::strayclosing:
         return inquotes(odd.name) + " is not open here: this closes what is open";
@@ -198,7 +198,8 @@ std::string tell(const oddity& odd, std::string_view text)
     case oddkind::trailing:
         break;
     }
-    return "nothing may follow the closing tag of the root";
+    return "nothing may follow the closing tag of the root: the daemon reads on, and watches what "
+           "targets stand here";
 }
 
 constexpr std::string_view kIntoAScript = "put a command that needs \"<\" in a script";
@@ -233,7 +234,7 @@ std::string cureof(const oddity& odd)
     case oddkind::instruction:
         return "put it there, or leave it out";
     case oddkind::attribute:
-        return "write " + tag(printable(odd.name));
+        return "write " + tag(brief(odd.name));
     case oddkind::emptytag:
         return "write NULL for no command, or a number";
     case oddkind::unknown:
@@ -241,7 +242,7 @@ std::string cureof(const oddity& odd)
     case oddkind::lateclosing:
         return "move it there";
     case oddkind::mismatched:
-        return "write </" + printable(odd.other) + ">";
+        return "write </" + brief(odd.other) + ">";
     case oddkind::unclosed:
         return "write </" + std::string(odd.name) + "> where it ends";
     case oddkind::misplaced:

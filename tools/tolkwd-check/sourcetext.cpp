@@ -16,6 +16,9 @@ namespace {
 
 constexpr std::size_t kBlockBytes = 1 << 20;
 
+// What is longer has no end, or is no configuration.
+constexpr std::size_t kMostBytes = 1 << 30;
+
 std::string readall(int fd)
 {
     std::string text;
@@ -26,6 +29,9 @@ std::string readall(int fd)
         text.resize(used + static_cast<std::size_t>(std::max<ssize_t>(got, 0)));
         if (got == 0) {
             return text;
+        }
+        if (text.size() > kMostBytes) {
+            throw std::system_error(EFBIG, std::generic_category());
         }
         if (got < 0 && errno != EINTR) {
             throw std::system_error(errno, std::generic_category());

@@ -51,7 +51,8 @@ private:
 };
 
 // The whole content of the file `path`, or of standard input for "-"; raises std::system_error
-// where it cannot be read.
+// where it cannot be read, or is
+// longer than a GiB.
 std::string readwhole(const std::string& path);
 
 } // namespace check
