@@ -298,13 +298,13 @@ public:
         }
         if (view.loaded) {
             comparetargets();
-            for (const writtentarget& written : doc.targets) {
-                checktarget(written);
-            }
             checktargetcount();
             checkending();
         } else {
             tellfailure();
+        }
+        for (const writtentarget& written : doc.targets) {
+            checktarget(written);
         }
         telloddities();
     }
