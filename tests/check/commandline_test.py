@@ -1,0 +1,159 @@
+"""The command line of tolkwd-check: its exit statuses, and what it writes where. Runs nothing that
+the files say."""
+
+import json
+import os
+import subprocess
+
+import pytest
+
+LIMIT_SECONDS = 60
+
+FIELDS = {
+    "name": "web",
+    "binarypath": "/usr/sbin/webd",
+    "startcmd": "timeout 60 service web start",
+    "stopcmd": "timeout 60 service web stop",
+    "functionalpingcmd": "NULL",
+    "genpinginterval": "60",
+    "funpinginterval": "60",
+    "maxattemptofwakeup": "3",
+    "messageformat": "x",
+    "hackmessagehandler": "x",
+    "sendmessagehandler": "x",
+    "MaxFPSkips": "0",
+    "ThresholdAverageCPUUsage": "90000",
+    "ThresholdMemoryUsage": "262144",
+    "ThresholdThreadCount": "200",
+    "ThresholdHandleCount": "100",
+}
+
+
+def configuration(before="", **fields):
+    """A file with one target, with these fields and what is to stand before it."""
+    lines = "".join(f"<{key}>{value}</{key}>\n" for key, value in {**FIELDS, **fields}.items())
+    return ("<?xml version='1.0'?>\n<wdtargets>\n" + before +
+            "<wdmonitortarget>\n<wdmonitorservice>\n" + lines +
+            "</wdmonitorservice>\n</wdmonitortarget>\n</wdtargets>\n")
+
+
+SOUND = configuration()
+NOTED = configuration(before="<!-- web -->\n")
+WARNED = configuration(before="<!-- für --><!-- web -->\n", maxattemptofwakeup="1")
+WRONG = configuration(before="<!-- web -->\n", maxattemptofwakeup="0")
+
+
+@pytest.fixture(scope="session")
+def machinerules(program):
+    """The options that leave out what depends on the machine."""
+    return [word for rule in ["binary-missing", "ping-folder", "unknown-service", "writable-file"]
+            for word in ("--allow", rule)]
+
+
+@pytest.fixture
+def run(program, machinerules, tmp_path):
+    def runprogram(*arguments, text=None, **options):
+        names = []
+        if text is not None:
+            (tmp_path / "web.xml").write_text(text)
+            names = [*machinerules, "web.xml"]
+        options = {"stdout": subprocess.PIPE, **options}
+        return subprocess.run([program, *arguments, *names], cwd=tmp_path,
+                              stdin=subprocess.DEVNULL, stderr=subprocess.PIPE,
+                              encoding="utf-8", timeout=LIMIT_SECONDS, **options)
+    return runprogram
+
+
+@pytest.mark.parametrize("text, status", [(SOUND, 0), (NOTED, 0), (WARNED, 1), (WRONG, 2)])
+@pytest.mark.parametrize("form", [[], ["--json"], ["--plan"]])
+def test_status_is_that_of_the_gravest_finding(run, form, text, status):
+    result = run(*form, text=text)
+    assert result.returncode == status
+    assert result.stderr == ""
+
+
+@pytest.mark.parametrize("form", [[], ["--json"]])
+def test_a_file_that_cannot_be_read_is_an_error(run, form):
+    result = run(*form, "no-such-file.xml")
+    assert result.returncode == 2
+    assert "unreadable-file" in result.stdout
+    assert "No such file or directory" in result.stdout
+
+
+@pytest.mark.parametrize("arguments", [
+    [], ["--plan"], ["--no-such-option", "web.xml"], ["web.xml", "another.xml"],
+    ["--allow", "no-such-rule", "web.xml"], ["--explain", "no-such-rule"], ["--explain"],
+    ["-t", "soon", "--plan", "web.xml"]])
+def test_a_wrong_command_line_ends_with_the_status_of_usage(run, arguments):
+    result = run(*arguments)
+    assert result.returncode == 64
+    assert result.stdout == ""
+    assert result.stderr != ""
+
+
+@pytest.mark.parametrize("arguments, begin", [
+    (["--help"], "Tells what tolkwd will make of a configuration"),
+    (["--version"], "tolkwd-check "), (["--rules"], "attempts-negative  "),
+    (["--explain", "comment"], "comment: ")])
+def test_who_asks_for_help_needs_no_file(run, arguments, begin):
+    result = run(*arguments)
+    assert result.returncode == 0
+    assert result.stdout.startswith(begin)
+    assert result.stderr == ""
+
+
+@pytest.mark.parametrize("arguments, text", [([], WARNED), (["--plan"], SOUND),
+                                             (["--json"], SOUND), (["--rules"], None)])
+def test_output_that_cannot_be_written_is_a_failure_of_its_own(run, arguments, text):
+    with open("/dev/full", "w") as full:
+        result = run(*arguments, text=text, stdout=full)
+    assert result.returncode == 70
+    assert result.stderr == "tolkwd-check: the output cannot be written\n"
+
+
+@pytest.mark.parametrize("variables, coloured", [
+    ({"TERM": "xterm"}, True), ({"TERM": "xterm", "NO_COLOR": ""}, True),
+    ({"TERM": "xterm", "NO_COLOR": "1"}, False), ({"TERM": "dumb"}, False)])
+def test_only_a_terminal_that_wants_them_gets_colours(run, variables, coloured):
+    kept = {name: value for name, value in os.environ.items() if name not in ("TERM", "NO_COLOR")}
+    leader, follower = os.openpty()
+    run(text=WARNED, stdout=follower, env={**kept, **variables})
+    os.close(follower)
+    shown = os.read(leader, 4096)
+    os.close(leader)
+    assert (b"\033[" in shown) == coloured
+    assert b"\033" not in run(text=WARNED).stdout.encode()
+
+
+@pytest.mark.parametrize("options, seconds", [
+    ([], 10800), (["-t", "120"], 120), (["-t", "119"], 10800), (["-t", "-1"], 10800),
+    (["-t", "5000"], 5000)])
+def test_a_plan_takes_the_refresh_period_as_the_daemon_does(run, options, seconds):
+    assert f"; a refresh comes every {seconds} s (-t).\n" in run(
+        "--plan", *options, text=SOUND).stdout
+    plan = json.loads(run("--plan", "--json", *options, text=SOUND).stdout)["plan"]
+    assert [target["refresh"]["seconds"] for target in plan] == [seconds]
+
+
+def test_an_empty_line_stands_between_findings_and_plan_only(run):
+    assert run("--plan", text=SOUND).stdout.startswith("1 target; ")
+    findings = run(text=WARNED).stdout
+    assert run("--plan", text=WARNED).stdout.startswith(findings + "\n1 target; ")
+
+
+def test_json_tells_what_is_found_and_where(run):
+    result = json.loads(run("--json", text=WARNED).stdout)
+    attempts, comments = result["findings"][-1], result["findings"][:-1]
+    assert [each["severity"] for each in comments] == ["note", "note"]
+    assert [(each["line"], each["column"]) for each in comments] == [(3, 1), (3, 13)]
+    assert comments[1]["offset"] == WARNED.encode().index(b"<!-- web")
+    assert attempts["rule"] == "attempts-one"
+    assert attempts["severity"] == "warning"
+    lines = WARNED.splitlines()
+    assert lines[attempts["line"] - 1][attempts["column"] - 1:].startswith("1</maxattempt")
+    assert json.loads(run("--json", text=WRONG).stdout)["findings"][-1]["severity"] == "error"
+
+
+def test_what_an_allowed_rule_finds_does_not_count(run):
+    result = run("--allow", "attempts-one", "--allow", "comment", text=WARNED)
+    assert (result.returncode, result.stdout) == (0, "")
