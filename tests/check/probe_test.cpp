@@ -331,6 +331,7 @@ TEST_F(Probe, FindsAServiceBusyOnlyAboveItsThreshold)
         {.check = "echo service: ok", .binarypath = sleeper, .threads = "0"},
         {.check = "echo service: ok", .binarypath = sleeper, .maxskips = "0", .threads = "0"},
         {.check = "NULL", .binarypath = sleeper, .threads = "0"},
+        {.check = "echo service: ok", .binarypath = sleeper, .maxskips = "-1", .threads = "0"},
     });
     kill(child, SIGKILL);
     waitpid(child, nullptr, 0);
@@ -338,9 +339,13 @@ TEST_F(Probe, FindsAServiceBusyOnlyAboveItsThreshold)
     EXPECT_FALSE(probes.at(0).process.busy());
     EXPECT_TRUE(probes.at(1).process.busy());
     EXPECT_EQ(probes.at(0).process.processor.value, 0); // it sleeps
-    EXPECT_EQ(rules(), strings{"probe-busy warning"});
+    EXPECT_EQ(rules(), (strings{"probe-busy warning", "probe-busy warning"}));
     EXPECT_FALSE(probes.at(2).process.counts);
     EXPECT_FALSE(probes.at(3).process.counts);
+    EXPECT_TRUE(probes.at(4).process.counts);
+    EXPECT_TRUE(found.sorted().back().message.ends_with("leave its check out, without end"));
+    EXPECT_TRUE(written({probes.at(1)}).ends_with("left out, up to 3 times in a row\n"));
+    EXPECT_TRUE(written({probes.at(4)}).ends_with("left out, without end\n"));
 }
 
 TEST_F(Probe, KnowsNoProcessorTimeOfAProcessThatItHasReadOnce)
@@ -439,6 +444,19 @@ TEST_F(Probe, WritesInPlainWords)
 )");
 }
 
+TEST_F(Probe, WritesTheBeginningOfALongAnswer)
+{
+    const auto told = [](std::size_t bytes) {
+        targetprobe probe;
+        probe.status.firstline = std::string(bytes, 'x');
+        probe.status.readable = true;
+        return written({probe});
+    };
+    EXPECT_NE(told(160).find('"' + std::string(160, 'x') + "\"\n"), std::string::npos) << told(160);
+    EXPECT_NE(told(161).find('"' + std::string(160, 'x') + "...\n"), std::string::npos)
+        << told(161);
+}
+
 TEST_F(Probe, KeepsTheTerminalFromWhatCommandsAnswer)
 {
     answers("web", R"(printf '\033[2J\377 is running\n')");
@@ -465,6 +483,7 @@ TEST_F(Probe, GivesOtherProgramsAllThatItKnows)
     EXPECT_TRUE(json[0]["process"]["threads"]["value"].is_null());
     EXPECT_EQ(json[0]["process"]["threads"]["threshold"], 200);
     EXPECT_TRUE(json[1]["check"].is_null());
+    EXPECT_TRUE(probejson({targetprobe()})[0]["status"]["exit-status"].is_null()); // killed
 }
 
 } // namespace

@@ -165,10 +165,11 @@ def test_nothing_is_run_unless_the_answer_is_yes(sandbox, answer):
     assert sandbox.untouched()
 
 
-def test_what_the_answer_yes_allows_is_run(sandbox):
+@pytest.mark.parametrize("answer", [b"y\n", b"yes\n"])
+def test_what_the_answer_yes_allows_is_run(sandbox, answer):
     sandbox.service("web", "echo web is running")
     sandbox.configure({"name": "web"})
-    assert sandbox.run("$others --probe /opt/stage/tolkwd.xml", b"y\n").returncode == 0
+    assert sandbox.run("$others --probe /opt/stage/tolkwd.xml", answer).returncode == 0
     assert sandbox.calls() == ["web status"]
 
 
@@ -230,6 +231,20 @@ def test_the_figures_stand_beside_the_thresholds(sandbox):
     assert "ThresholdAverageCPUUsage" in result["findings"][0]["message"]
 
 
+def test_the_load_is_reckoned_with_what_was_measured(sandbox):
+    sandbox.service("web", "sleep 1.5; echo web is running")
+    sandbox.configure({"name": "web", "genpinginterval": "1"})
+    lint = "$(tolkwd-check --rules | sed '/^lock-starved/d; s/ .*//; s/^/--allow /')"
+    assert sandbox.run(f"{lint} /opt/stage/tolkwd.xml").stdout == b""  # as guessed
+    sandbox.configure({"name": "web", "genpinginterval": "1"},
+                      {"name": "web", "genpinginterval": "1"})
+    assert sandbox.run(f"{lint} /opt/stage/tolkwd.xml").stdout == b""
+    played = sandbox.run(f"{lint} --probe --yes /opt/stage/tolkwd.xml")
+    assert played.returncode == 1
+    assert b"as they took now: " in played.stdout
+    assert b"[lock-starved]" in played.stdout
+
+
 def test_hostile_answers_do_not_reach_the_terminal(sandbox):
     sandbox.service("web", r"printf '\033[2J\r\033]0;x\007 is running\n'")
     sandbox.configure({"name": "web", "functionalpingcmd": r"printf '\033[31m\302\233no\n' >&2"})
@@ -246,7 +261,8 @@ def test_hostile_answers_do_not_reach_the_terminal(sandbox):
 def test_an_interrupt_ends_the_probe_and_runs_nothing_more(sandbox, number, whom):
     """Also where the command does not get the signal: timeout(1) leaves the terminal's group."""
     sandbox.service("web", "sleep 30; echo web is running")
-    sandbox.configure({"name": "web"}, {"name": "mail"})
+    sandbox.configure({"name": "web", "functionalpingcmd": "touch /opt/stage/started"},
+                      {"name": "mail"})
     kill = "kill -%d -- %s$!" % (number, "-" if whom == "group" else "")
     command = sandbox.command(
         f"set -m; tolkwd-check {PROBE} </dev/null &\n"
