@@ -2,6 +2,8 @@
 
 #include "daemonview.h"
 
+#include <filesystem>
+#include <iterator>
 #include <string>
 
 #include <gtest/gtest.h>
@@ -92,6 +94,17 @@ TEST_F(DaemonView, TellsWhyALoadFails)
     EXPECT_FALSE(view.loaded);
     EXPECT_EQ(view.failure, in(text, "<name/>"));
     EXPECT_EQ(view.targets.size(), 1U);
+}
+
+TEST_F(DaemonView, LeavesNoFileOpen)
+{
+    const auto open = [] {
+        return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {});
+    };
+    const auto before = open();
+    readasdaemon("<wdtargets></wdtargets>");
+    readasdaemon("<wdtargets><></wdtargets>");
+    EXPECT_EQ(open(), before);
 }
 
 TEST_F(DaemonView, NothingIsRead)

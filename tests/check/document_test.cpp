@@ -50,6 +50,8 @@ TEST(Document, ValuesAreWhatTheirTextMeans)
     EXPECT_EQ(valueof("<name>a<!-- b -->c</name>"), "ac");
     EXPECT_EQ(valueof("<name><![CDATA[a < b]]></name>"), "a < b");
     EXPECT_EQ(valueof("<name>a &amp;&lt;&#65;&#x42;&#8364; &b; &</name>"), "a &<AB€ &b; &");
+    EXPECT_EQ(valueof("<name>&#228;&#xe4;&#128512;</name>"), "ää😀");
+    EXPECT_EQ(valueof("<name>&#x110000;</name>"), "&#x110000;"); // beyond the last one
     EXPECT_EQ(valueof("<name>a < b</name>"), "a < b");
     EXPECT_EQ(valueof("<name>a </b >c</name>"), "a </b >c");
     EXPECT_EQ(valueof("<name>a <b >c</name>"), "a <b >c");
@@ -112,6 +114,32 @@ TEST(Document, ClosingTagsOfInnerElementsCloseNothingThatGoesOn)
     ASSERT_EQ(misspelt.oddities.size(), 1U);
     EXPECT_EQ(misspelt.oddities[0].kind, oddkind::mismatched);
     EXPECT_EQ(kinds("</wdmonitorservice></wdmonitorservice><wdmonitorservice>"), "strayclosing");
+}
+
+// The daemon skips it to its first "?" only.
+TEST(Document, OnlyAPlainDeclarationAtTheBeginningIsOrdinary)
+{
+    const std::string root = "<wdtargets></wdtargets>";
+    EXPECT_TRUE(readdocument("<?xml version='1.0'?>" + root).oddities.empty());
+    for (const char* const odd : {"\n<?xml version='1.0'?>", "<?xml version='1.0' a='?'?>"}) {
+        const document doc = readdocument(odd + root);
+        ASSERT_EQ(doc.oddities.size(), 1U) << odd;
+        EXPECT_EQ(doc.oddities[0].kind, oddkind::instruction) << odd;
+    }
+}
+
+// What is looked for and missing is not looked for at each beginning anew: with the square of its
+// length this would take hours.
+TEST(Document, ATextOfNothingButBeginningsIsReadAtOnce)
+{
+    constexpr std::size_t kBeginnings = 150000;
+    for (const std::string_view beginning : {"<!-- >", "<![CDATA[>", "<!DOCTYPE [>"}) {
+        std::string text = "<wdtargets>";
+        for (std::size_t i = 0; i < kBeginnings; ++i) {
+            text += beginning;
+        }
+        EXPECT_EQ(readdocument(text).oddities.size(), kBeginnings + 1) << beginning; // no end
+    }
 }
 
 TEST(Document, EndIsTold)

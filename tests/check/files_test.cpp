@@ -91,6 +91,19 @@ TEST_F(Files, TellScripts)
     EXPECT_FALSE(files.isscript(folder + "/none"));
 }
 
+// A file may name thousands of programs.
+TEST_F(Files, AreNotLeftOpen)
+{
+    const auto open = [] {
+        return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {});
+    };
+    const auto before = open();
+    EXPECT_TRUE(files.isscript(make("script", 0755, "#!/bin/sh\n")));
+    EXPECT_FALSE(files.isscript(make("short", 0755, "#")));
+    EXPECT_FALSE(files.isservice("no-such-service"));
+    EXPECT_EQ(open(), before);
+}
+
 TEST_F(Files, KnowNoServiceOfAnInventedName)
 {
     EXPECT_FALSE(files.isservice("no-such-service"));

@@ -32,6 +32,7 @@ TEST(Printable, WritesOutWhatTurnsOrHidesText)
                         "b"),
               "a\\u{202e}b");
     EXPECT_EQ(printable("a\u200bb\ufeff"), "a\\u{200b}b\\u{feff}");
+    EXPECT_EQ(printable("a\u200fb\u202e\u2066"), "a\\u{200f}b\\u{202e}\\u{2066}");
     EXPECT_EQ(printable("\xe2\x81\xa6\xf3\xa0\x81\x81"), "\\u{2066}\\u{e0041}");
 }
 // NOLINTEND(misc-misleading-bidirectional)
@@ -43,6 +44,7 @@ TEST(Printable, WritesBytesThatAreNotUtf8Out)
     EXPECT_EQ(printable("\xc0\xaf"), "\\xc0\\xaf");                   // too long for what it says
     EXPECT_EQ(printable("\xe0\x80\xaf"), "\\xe0\\x80\\xaf");          // the same
     EXPECT_EQ(printable("\xed\xa0\x80"), "\\xed\\xa0\\x80");          // half of a pair
+    EXPECT_EQ(printable("\xed\xbf\xbf"), "\\xed\\xbf\\xbf");          // the other half
     EXPECT_EQ(printable("\xf4\x90\x80\x80"), "\\xf4\\x90\\x80\\x80"); // beyond the last one
 }
 

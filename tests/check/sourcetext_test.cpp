@@ -32,6 +32,7 @@ TEST(SourceText, ColumnsAreCharacters)
     const sourcetext source("für\n\xff\xfex");
     EXPECT_EQ(at(source, 3), "1:3");
     EXPECT_EQ(at(source, 7), "2:3");
+    EXPECT_EQ(at(source, 5), "2:1"); // also before the place that was asked for last
 }
 
 TEST(SourceText, PlacesBehindTheEndAreTheEnd)
