@@ -70,6 +70,18 @@ TEST_F(DaemonView, CarriedValuesKeepTheirOrigin)
     EXPECT_EQ(view.targets[2].monitored.begin, kNoPlace);
 }
 
+TEST_F(DaemonView, AFieldOutsideAServiceIsTheNextDependents)
+{
+    const std::string text =
+        "<wdtargets><wdmonitortarget><wdmonitorservice><name>web</name></wdmonitorservice>"
+        "<name>lost</name><wdmondependsev></wdmondependsev></wdmonitortarget></wdtargets>";
+    const targetview target = readasdaemon(text).targets.at(0);
+    EXPECT_EQ(target.monitored.origins[name].text, in(text, "web"));
+    EXPECT_EQ(target.dependents.at(0).record->name.str(), "lost");
+    EXPECT_EQ(target.dependents.at(0).origins[name].element, in(text, "<name>", 2));
+    EXPECT_EQ(target.dependents.at(0).origins[name].text, in(text, "lost"));
+}
+
 TEST_F(DaemonView, EachReadingIsThatOfADaemonThatHasJustStarted)
 {
     readasdaemon("<wdtargets><wdmonitortarget><wdmonitorservice><name>old</name><b></wdtargets>");

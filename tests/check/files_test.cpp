@@ -54,6 +54,7 @@ TEST_F(Files, TellWhoMayWrite)
     if (root) {
         ASSERT_EQ(chown(group.c_str(), 0, 65534), 0);
         ASSERT_EQ(chmod(group.c_str(), 0620), 0);
+        EXPECT_FALSE(files.of(make("rootsgroup", 0620)).exposed);
     }
     EXPECT_TRUE(files.of(group).exposed);
     EXPECT_TRUE(files.of("/tmp").exposed) << "sticky or not";

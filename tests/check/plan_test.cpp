@@ -25,6 +25,7 @@ std::string element(const std::string& name, const std::string& text)
 // What a service says; the texts that are not given are those of a plain one.
 struct fields {
     std::string name = "web";
+    std::string program = "/usr/sbin/webd";
     std::string startcmd = "NULL";
     std::string stopcmd = "NULL";
     std::string check = "NULL";
@@ -41,7 +42,7 @@ std::string record(const std::string& kind, const fields& given)
 {
     return element(
         kind,
-        element("name", given.name) + element("binarypath", "/usr/sbin/webd") +
+        element("name", given.name) + element("binarypath", given.program) +
             element("startcmd", given.startcmd) + element("stopcmd", given.stopcmd) +
             element("functionalpingcmd", given.check) + element("genpinginterval", given.general) +
             element("funpinginterval", given.functional) +
@@ -319,6 +320,18 @@ TEST_F(Plan, SkipsTellHowLongAFailureCanStayUnnoticed)
     expectpart(told(targetof(busy)), "(At 720 s if it is busy all the time");
 }
 
+// A process has one thread at least, one page, and used no processor if it sleeps; above the
+// threshold is who has more.
+TEST_F(Plan, TheLeastThresholdsAreNotAlwaysExceeded)
+{
+    const auto busy = [this](const fields& given) {
+        return plannedone(given).check->busy;
+    };
+    EXPECT_EQ(busy({.check = "ask", .skips = "1", .processor = "0"}), busyness::overthreshold);
+    EXPECT_EQ(busy({.check = "ask", .skips = "1", .memory = "1"}), busyness::overthreshold);
+    EXPECT_EQ(busy({.check = "ask", .skips = "1", .threads = "1"}), busyness::overthreshold);
+}
+
 TEST_F(Plan, NegativeSkipsLeaveAFailureUnnoticedWithoutEnd)
 {
     const fields busy{.check = "ask", .skips = "-1"};
@@ -405,9 +418,9 @@ TEST_F(Plan, OddBytesDoNotReachTheTerminal)
 {
     const std::string direction = std::string("\xe2\x80") + "\xae"; // turns what follows it
     const std::string odd = "w\033[2J\xff" + direction + "b\nc";
-    const std::string text =
-        told(targetof({.name = odd, .startcmd = odd, .check = odd}, {{.name = odd}}) +
-             targetof({.name = odd, .attempts = odd}));
+    const std::string text = told(
+        targetof({.name = odd, .program = odd, .startcmd = odd, .check = odd}, {{.name = odd}}) +
+        targetof({.name = odd, .attempts = odd}));
     expectnot(text, "\033");
     expectnot(text, "\xff");
     expectnot(text, direction);

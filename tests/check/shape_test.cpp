@@ -40,12 +40,15 @@ std::vector<std::string> foundin(const std::string& text)
     return result;
 }
 
-// The fields of a service, none of them missing.
-std::string fields(const std::string& name)
+// The fields of a service, but for one.
+std::string fields(const std::string& name, const std::string& missing = "")
 {
     std::string text;
     for (const fieldelement& field : kFieldElements) {
         const std::string key(field.name);
+        if (key == missing) {
+            continue;
+        }
         text.append("<").append(key).append(">");
         text.append(key == "name" ? name : key == "functionalpingcmd" ? "NULL" : "1");
         text.append("</").append(key).append(">");
@@ -112,6 +115,24 @@ TEST(Shape, TellsOnceOfAllThatFollowsTheRoot)
                 ElementsAre("warning trailing-text x<wdmonitortarget>"));
 }
 
+TEST(Shape, TellsWhatAMissingFieldMeans)
+{
+    const auto message = [](const std::string& missing) {
+        const std::string text =
+            file(target("<wdmonitorservice>" + fields("web", missing) + "</wdmonitorservice>"));
+        findings found;
+        check::checkshape(sourcetext(text), check::readasdaemon(text), found);
+        return found.sorted().at(0).message;
+    };
+    EXPECT_EQ(message("ThresholdMemoryUsage"), "ThresholdMemoryUsage is missing in \"web\": at the "
+                                               "start it is empty (0: always exceeded)");
+    EXPECT_EQ(message("maxattemptofwakeup"),
+              "maxattemptofwakeup is missing in \"web\": at the start it is empty (0: the service "
+              "is given up at once and never asked)");
+    EXPECT_EQ(message("stopcmd"), "stopcmd is missing in \"web\": at the start it is empty "
+                                  "(nothing stops the service)");
+}
+
 // A comment whose "/" ends the monitored service: its tags are read.
 TEST(Shape, TellsOfADependentThatNobodyMeant)
 {
@@ -131,7 +152,15 @@ TEST(Shape, TellsOfADependentThatNobodyMeant)
     EXPECT_EQ(sorted.front().level, severity::error);
 }
 
-// The comment with a "/" is harmless where no service is open; what loses the target is the other.
+// The first comment is harmless, the second one ends the target.
+TEST(Shape, PutsALostDependentDownToWhatIsBeforeIt)
+{
+    EXPECT_THAT(foundin("<wdtargets><!-- x --><wdmonitortarget>" + monitored("web") +
+                        "<!-- a/b -->" + dependent("db") + "</wdmonitortarget></wdtargets>"),
+                ElementsAre("note comment <!-- x -->", "error comment <!-- a/b -->"));
+}
+
+// Text between elements is harmless.
 TEST(Shape, BlamesForALostTargetWhatStaysOpenInsideIt)
 {
     EXPECT_THAT(foundin(file(target(monitored("web") + "text<group>" + dependent("db")))),

@@ -111,6 +111,104 @@ TEST(Values, OfAnEarlierTargetAreComparedWithThoseOfTheSameName)
                 ElementsAre("duplicate-service name"));
 }
 
+// A monitored service with a check and these fields.
+std::string checked(const std::string& fields)
+{
+    return file(target("<name>a</name><functionalpingcmd>ask</functionalpingcmd>"
+                       "<MaxFPSkips>3</MaxFPSkips>" +
+                       fields));
+}
+
+TEST(Values, OfOnePauseMayBeNothingIfThereIsTheOther)
+{
+    const std::string none = "<genpinginterval>0</genpinginterval>";
+    EXPECT_THAT(foundin(checked(none + "<funpinginterval>1</funpinginterval>")), IsEmpty());
+    EXPECT_THAT(foundin(checked(none + "<funpinginterval>0</funpinginterval>")),
+                ElementsAre("interval-zero genpinginterval"));
+}
+
+TEST(Values, OfThresholdsLookLikePerCentUpToAHundred)
+{
+    const auto processor = [](const std::string& value) {
+        return foundin(
+            checked("<ThresholdAverageCPUUsage>" + value + "</ThresholdAverageCPUUsage>"));
+    };
+    EXPECT_THAT(processor("100"), ElementsAre("threshold-unit ThresholdAverageCPUUsage"));
+    EXPECT_THAT(processor("101"), IsEmpty());
+}
+
+TEST(Values, OfMemoryLookLikeBytesOnlyAsWholeMebibytes)
+{
+    const auto memory = [](const std::string& value) {
+        return foundin(checked("<ThresholdMemoryUsage>" + value + "</ThresholdMemoryUsage>"));
+    };
+    EXPECT_THAT(memory("100"), ElementsAre("threshold-unit ThresholdMemoryUsage"));
+    EXPECT_THAT(memory("101"), IsEmpty());
+    EXPECT_THAT(memory("1073741824"), ElementsAre("threshold-unit ThresholdMemoryUsage"));
+    EXPECT_THAT(memory("2147483647"), IsEmpty()); // what switches it off
+}
+
+TEST(Values, BelowAllMeasureAreNegative)
+{
+    EXPECT_THAT(foundin(checked("<genpinginterval>-99999999999</genpinginterval>"
+                                "<funpinginterval>99999999999</funpinginterval>")),
+                ElementsAre("negative-number genpinginterval", "number-range funpinginterval"));
+}
+
+TEST(Values, OfADependentTellWhetherItIsStartedAgain)
+{
+    const auto dependent = [](const std::string& start, const std::string& stop) {
+        return foundin(
+            file(target("<name>a</name><functionalpingcmd>NULL</functionalpingcmd>",
+                        "<wdmondependsev><name>b</name><startcmd>" + start +
+                            "</startcmd><stopcmd>" + stop + "</stopcmd></wdmondependsev>")));
+    };
+    EXPECT_THAT(dependent("true", "stop b"), ElementsAre("dependent-not-started startcmd"));
+    EXPECT_THAT(dependent("stop b", "stop b"), ElementsAre("dependent-not-started startcmd"));
+    EXPECT_THAT(dependent("restart b", "restart b"), IsEmpty());
+    EXPECT_THAT(dependent("true", "true"), IsEmpty()); // nothing stops it either
+    EXPECT_THAT(dependent("NULL", "stop b"), IsEmpty());
+}
+
+// Nobody runs the check of a dependent.
+TEST(Values, OnlyWhatIsRunNeedsATimeLimit)
+{
+    const auto unbounded = [](const std::string& monitored, const std::string& dependent) {
+        const std::string commands =
+            "<startcmd>timeout 9 a</startcmd><stopcmd>timeout 9 b</stopcmd>"
+            "<functionalpingcmd>";
+        const std::string end = "</functionalpingcmd>";
+        const std::string text = file(target("<name>a</name>" + commands + monitored + end,
+                                             "<wdmondependsev><name>b</name>" + commands +
+                                                 dependent + end + "</wdmondependsev>"));
+        findings found;
+        check::checkvalues(check::readasdaemon(text), found);
+        return found.sorted().size();
+    };
+    EXPECT_EQ(unbounded("timeout 9 ask", "ask"), 0U);
+    EXPECT_EQ(unbounded("ask", "ask"), 1U);
+}
+
+// Also where the service is a dependent in between.
+TEST(Values, OfTwoTargetsOfOneServiceTheSecondIsFound)
+{
+    const std::string none = "<functionalpingcmd>NULL</functionalpingcmd>";
+    const std::string web = target("<name>web</name>" + none);
+    const std::string database =
+        target("<name>db</name>" + none, "<wdmondependsev><name>web</name></wdmondependsev>");
+    EXPECT_THAT(foundin(file(web + database)), IsEmpty());
+    EXPECT_THAT(foundin(file(web + database + web)), ElementsAre("duplicate-service name"));
+}
+
+TEST(Values, OtherSpellingsOfNoCommandAreFoundInAnyCase)
+{
+    for (const char* const spelling : {"null", "Null", "NONE", "'NULL'", "N/A", "-"}) {
+        EXPECT_THAT(foundin(checked(std::string("<stopcmd>") + spelling + "</stopcmd>")),
+                    ElementsAre("null-spelling stopcmd"))
+            << spelling;
+    }
+}
+
 std::size_t starved(const std::string& text, const std::vector<durations>& measured)
 {
     const daemonview view = check::readasdaemon(text);
