@@ -1,14 +1,15 @@
 #!/usr/bin/python3
-"""Breaks the daemon on purpose, one behaviour at a time, and shows that its tests notice.
+"""Breaks the daemon and its checker on purpose, one behaviour at a time, and shows that their tests
+notice.
 
 mutants.toml lists the mutants; each replaces one piece of one source file and names the promise
-that the daemon then no longer keeps. All work is done in a copy of the tracked files, as they are
+that the program then no longer keeps. All work is done in a copy of the tracked files, as they are
 in the working tree, in a temporary folder. The copy is built once and has to pass its tests. Then,
-for each mutant: change the file, build, run the unit tests of its module, then all unit tests, then
-the system tests, until one fails, and put the file back.
+for each mutant: change the file, build, run the tests of its module, then all tests of the program,
+those of the daemon's units before those of the whole, until one fails, and put the file back.
 
 The exit status is 0 when every mutant was caught, 1 when one survived, and 2 when the list, or the
-unbroken daemon itself, is at fault: a mutant that does not build, say, is not caught.
+unbroken program itself, is at fault: a mutant that does not build, say, is not caught.
 """
 
 import argparse
@@ -36,8 +37,11 @@ CONFIGURE = ["cmake", "--preset", "debug", "-DBUILD_TESTING=ON", "-DCMAKE_CXX_FL
 
 # Each kind of tests, and how long all of them may take together. A mutant that hangs is caught by
 # this bound; one that never stops growing is caught by the other.
-TEST_SECONDS = {"unit": 60, "system": 600}
+TEST_SECONDS = {"unit": 60, "system": 600, "check": 300}
 TEST_MEMORY_BYTES = 4 << 30
+
+# Which tests are for the files of a folder, the quick ones first.
+KINDS = {"src": ("unit", "system"), "tools": ("check",)}
 
 FAILED_TEST = re.compile(r"Test +#\d+: (\S+) .*\*\*\*")
 TIME_OUT = "time-out"
@@ -46,7 +50,7 @@ KEYS = {"name", "breaks", "file", "before", "after"}
 
 
 class Fault(Exception):
-    """The list of mutants does not fit the sources, or the unbroken daemon is broken."""
+    """The list of mutants does not fit the sources, or the unbroken program is broken."""
 
 
 def load_mutants():
@@ -74,12 +78,13 @@ def check_place(mutant):
         raise Fault(f"{mutant['name']}: changes nothing")
 
 
-def select(mutants, names):
-    """Returns the mutants of these names, or all where there are none."""
+def select(mutants, names, folder):
+    """Returns the mutants of these names, or all where there are none, in the folder."""
     unknown = set(names) - {mutant["name"] for mutant in mutants}
     if unknown:
         raise Fault(f"no such mutant: {', '.join(sorted(unknown))}")
-    return [mutant for mutant in mutants if not names or mutant["name"] in names]
+    return [mutant for mutant in mutants if mutant["file"].startswith(folder) and
+            (not names or mutant["name"] in names)]
 
 
 def git(*arguments):
@@ -140,31 +145,51 @@ def run_tests(folder, kind, pattern="."):
     return None
 
 
-def catch(folder, module):
+def kinds_for(mutant):
+    """Returns the kinds of tests that may catch the mutant."""
+    return KINDS[mutant["file"].split("/")[0]]
+
+
+def own_tests(kind, module):
+    """Returns the target and the name's beginning of each set of tests made for the module: those
+    of probe are also for probetext, and those of values for namevalues."""
+    prefix = {"unit": "", "check": "check_"}[kind]
+    names = [path.name.removesuffix("_test.cpp")
+             for path in sorted((ROOT / "tests" / kind).glob("*_test.cpp"))]
+    if kind == "check":
+        names = [name for name in names if module.startswith(name) or module.endswith(name)]
+    else:
+        names = [name for name in names if name == module]
+    return [(f"{prefix}{name}_test", f"{prefix.replace('_', '.')}{name}.") for name in names]
+
+
+def catch(folder, kinds, module):
     """Builds and tests the copy, the quick tests first; returns what run_tests does."""
-    caught = None
-    if (folder / f"tests/unit/{module}_test.cpp").exists():
-        build(folder, [f"{module}_test"])
-        caught = run_tests(folder, "unit", rf"^{module}\.")
-    if not caught:
-        build(folder)
-        caught = run_tests(folder, "unit")
-    if not caught and (caught := run_tests(folder, "system")):
-        # A busy machine can do that, too: whoever catches it has to catch it again.
-        caught = run_tests(folder, "system")
-        if caught == TIME_OUT:
-            raise Fault("the system tests take too long to tell")
-    return caught
+    for target, prefix in own_tests(kinds[0], module):
+        build(folder, [target])
+        if caught := run_tests(folder, kinds[0], f"^{re.escape(prefix)}"):
+            return caught
+    build(folder)
+    for kind in kinds:
+        if not (caught := run_tests(folder, kind)):
+            continue
+        if kind == "system":
+            # A busy machine can do that, too: whoever catches it has to catch it again.
+            caught = run_tests(folder, kind)
+            if caught == TIME_OUT:
+                raise Fault("the system tests take too long to tell")
+        return caught
+    return None
 
 
-def prepare(folder):
-    """Copies and builds the unbroken daemon, which has to pass its tests."""
+def prepare(folder, kinds):
+    """Copies and builds the unbroken programs, which have to pass their tests."""
     copy_project(folder)
     subprocess.run(CONFIGURE, cwd=folder, check=True, stdout=subprocess.DEVNULL)
     build(folder)
-    failed = run_tests(folder, "unit") or run_tests(folder, "system")
-    if failed:
-        raise Fault(f"the unbroken daemon fails: {failed}")
+    for kind in kinds:
+        if failed := run_tests(folder, kind):
+            raise Fault(f"the unbroken program fails: {failed}")
 
 
 def try_mutant(folder, mutant):
@@ -173,7 +198,7 @@ def try_mutant(folder, mutant):
     unbroken = path.read_text()
     path.write_text(unbroken.replace(mutant["before"], mutant["after"]))
     try:
-        return catch(folder, path.stem)
+        return catch(folder, kinds_for(mutant), path.stem)
     finally:
         path.write_text(unbroken)  # with a new time, so that it is built again
 
@@ -185,7 +210,8 @@ def try_mutants(mutants):
     with tempfile.TemporaryDirectory(prefix="tolkwd-mutation-",
                                      ignore_cleanup_errors=True) as name:
         folder = pathlib.Path(name)
-        prepare(folder)
+        # Each kind once, in the order in which they are first needed.
+        prepare(folder, dict.fromkeys(kind for mutant in mutants for kind in kinds_for(mutant)))
         for mutant in mutants:
             try:
                 caught = try_mutant(folder, mutant)
@@ -215,6 +241,8 @@ def parse_arguments():
                                      formatter_class=argparse.RawDescriptionHelpFormatter)
     parser.add_argument("--only", nargs="+", default=[], metavar="NAME",
                         help="try these mutants only")
+    parser.add_argument("--in", dest="folder", choices=KINDS, default="",
+                        help="try the mutants of this folder only: tools has the checker's")
     parser.add_argument("--table", metavar="FILE",
                         help="write a Markdown table of the results to FILE")
     parser.add_argument("--list", action="store_true",
@@ -228,7 +256,7 @@ def main():
     signal.signal(signal.SIGTERM, lambda *_: sys.exit(2))  # and tidy up
     start = time.monotonic()
     try:
-        mutants = select(load_mutants(), options.only)
+        mutants = select(load_mutants(), options.only, options.folder)
         if options.list:
             for mutant in mutants:
                 print(f"{mutant['name']}: {mutant['breaks']}")
