@@ -1,5 +1,5 @@
-"""The command line of tolkwd-check: its exit statuses, and what it writes where. Runs nothing that
-the files say."""
+"""The command line of tolkwd-check: its exit statuses, what it writes where, and files that nobody
+means. Runs nothing that the files say."""
 
 import json
 import os
@@ -8,6 +8,7 @@ import subprocess
 import pytest
 
 LIMIT_SECONDS = 60
+ESCAPE = "\x1b[31m"
 
 FIELDS = {
     "name": "web",
@@ -72,23 +73,57 @@ def test_status_is_that_of_the_gravest_finding(run, form, text, status):
     assert result.stderr == ""
 
 
-@pytest.mark.parametrize("form", [[], ["--json"]])
-def test_a_file_that_cannot_be_read_is_an_error(run, form):
-    result = run(*form, "no-such-file.xml")
-    assert result.returncode == 2
-    assert "unreadable-file" in result.stdout
-    assert "No such file or directory" in result.stdout
+@pytest.mark.parametrize("arguments", [["."], ["no/such/file"], ["--plan", "."],
+                                       ["--probe", "--yes", "."]])
+def test_a_file_that_cannot_be_read_is_an_error(run, arguments):
+    result = run(*arguments)
+    assert (result.returncode, result.stderr) == (2, "")
+    assert result.stdout.startswith(f"{arguments[-1]}:1:1: error: the file cannot be read: ")
+    assert result.stdout.endswith(" [unreadable-file]\n")
+
+
+def test_a_file_that_cannot_be_read_is_not_loaded(run):
+    result = run("--json", "--plan", "--probe", ".")
+    said = json.loads(result.stdout)
+    assert (result.returncode, result.stderr) == (2, "")
+    assert [each["rule"] for each in said.pop("findings")] == ["unreadable-file"]
+    assert said == {"version": 1, "file": ".", "loaded": False, "targets": [], "plan": [],
+                    "probe": []}
+
+
+def test_an_empty_file_is_an_error(run):
+    result = run(text="")
+    assert (result.returncode, result.stderr) == (2, "")
+    assert result.stdout == ("web.xml:1:1: error: the file is empty: nothing is watched "
+                             "[no-target]\n")
+
+
+@pytest.mark.parametrize("arguments, said", [
+    ([], "FILE is required"),
+    (["--plan"], "FILE is required"),
+    ([""], "FILE is required"),
+    (["one.xml", "two.xml"], "not expected: two.xml"),
+    (["--plann", "one.xml"], "not expected: --plann"),
+    (["--allow", "coment", "one.xml"], 'no rule is named "coment"'),
+    (["--explain", "coment"], 'no rule is named "coment"'),
+    (["--explain"], "1 required RULE missing"),
+    (["--plan", "-t", "1h", "one.xml"], "-t = 1h"),
+])
+def test_a_wrong_command_line_ends_with_the_status_of_usage(run, arguments, said):
+    result = run(*arguments)
+    assert (result.returncode, result.stdout) == (64, "")
+    assert said in result.stderr
 
 
 @pytest.mark.parametrize("arguments", [
-    [], ["--plan"], ["--no-such-option", "web.xml"], ["web.xml", "another.xml"],
-    ["--allow", "no-such-rule", "web.xml"], ["--explain", "no-such-rule"], ["--explain"],
-    ["-t", "soon", "--plan", "web.xml"]])
-def test_a_wrong_command_line_ends_with_the_status_of_usage(run, arguments):
+    ["-", ESCAPE], ["--" + ESCAPE], ["-t", ESCAPE, "-"], ["--plan=" + ESCAPE, "-"],
+    ["--explain", ESCAPE], ["--allow", ESCAPE, "-"],
+])
+def test_a_refused_command_line_does_not_steer_the_terminal(run, arguments):
     result = run(*arguments)
     assert result.returncode == 64
-    assert result.stdout == ""
-    assert result.stderr != ""
+    assert "\x1b" not in result.stdout + result.stderr
+    assert "\\x1b[31m" in result.stderr
 
 
 @pytest.mark.parametrize("arguments, begin", [
@@ -103,7 +138,9 @@ def test_who_asks_for_help_needs_no_file(run, arguments, begin):
 
 
 @pytest.mark.parametrize("arguments, text", [([], WARNED), (["--plan"], SOUND),
-                                             (["--json"], SOUND), (["--rules"], None)])
+                                             (["--json"], SOUND), (["--rules"], None),
+                                             (["--help"], None), (["--version"], None),
+                                             (["--explain", "comment"], None), (["."], None)])
 def test_output_that_cannot_be_written_is_a_failure_of_its_own(run, arguments, text):
     with open("/dev/full", "w") as full:
         result = run(*arguments, text=text, stdout=full)
@@ -157,3 +194,44 @@ def test_json_tells_what_is_found_and_where(run):
 def test_what_an_allowed_rule_finds_does_not_count(run):
     result = run("--allow", "attempts-one", "--allow", "comment", text=WARNED)
     assert (result.returncode, result.stdout) == (0, "")
+
+
+def test_without_proc_nothing_is_told_about_the_file(program):
+    result = subprocess.run(
+        ["bwrap", "--ro-bind", "/", "/", "--tmpfs", "/proc", "--dev", "/dev", "--", program, "-"],
+        input=SOUND, stdout=subprocess.PIPE,
+        stderr=subprocess.PIPE, text=True, timeout=LIMIT_SECONDS)
+    assert result.returncode == 70
+    assert result.stdout == ""
+    assert result.stderr == "tolkwd-check: /proc/self/fd: No such file or directory\n"
+
+
+TARGET = "<wdmonitortarget>{}</wdmonitortarget>"
+NAME = "<name>web</name>"
+
+
+def monitored(fields):
+    return TARGET.format(f"<wdmonitorservice>{fields}</wdmonitorservice>")
+
+
+MEGABYTE = 1000000
+LARGE_FILES = {
+    "one service of many fields": monitored(NAME + 400000 * "<startcmd>a</startcmd>"),
+    "a large service and many that lack all": (
+        monitored(200000 * "<startcmd>a</startcmd>") + 40000 * monitored("")),
+    "many lost dependents": TARGET.format(
+        f"<wdmonitorservice>{NAME}</wdmonitorservice></name>"
+        + 400000 * "<wdmondependsev></wdmondependsev>"),
+    "many signs in values, and blanks behind": (
+        monitored(100000 * "<startcmd>a <b></startcmd>") + "</wdtargets>" + 4 * MEGABYTE * " "),
+    "a long unknown name and many closing tags": (
+        "<" + 12 * MEGABYTE * "x" + ">" + 400000 * "</a>"),
+}
+
+
+@pytest.mark.parametrize("kind", LARGE_FILES)
+def test_time_does_not_grow_with_the_square_of_the_file(program, kind):
+    result = subprocess.run([program, "-"], input=f"<wdtargets>{LARGE_FILES[kind]}",
+                            stdout=subprocess.PIPE, encoding="utf-8", timeout=LIMIT_SECONDS)
+    assert result.returncode == 2
+    assert result.stdout.startswith("-:1:")

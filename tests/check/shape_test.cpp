@@ -124,13 +124,14 @@ TEST(Shape, TellsWhatAMissingFieldMeans)
         check::checkshape(sourcetext(text), check::readasdaemon(text), found);
         return found.sorted().at(0).message;
     };
-    EXPECT_EQ(message("ThresholdMemoryUsage"), "ThresholdMemoryUsage is missing in \"web\": at the "
-                                               "start it is empty (0: always exceeded)");
+    EXPECT_EQ(message("ThresholdMemoryUsage"),
+              "ThresholdMemoryUsage is missing in \"web\": at the "
+              "start it is empty (0: always exceeded); write it here");
     EXPECT_EQ(message("maxattemptofwakeup"),
               "maxattemptofwakeup is missing in \"web\": at the start it is empty (0: the service "
-              "is given up at once and never asked)");
+              "is given up at once and never asked); write it here");
     EXPECT_EQ(message("stopcmd"), "stopcmd is missing in \"web\": at the start it is empty "
-                                  "(nothing stops the service)");
+                                  "(nothing stops the service); write it here");
 }
 
 // A comment whose "/" ends the monitored service: its tags are read.
