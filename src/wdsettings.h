@@ -27,5 +27,5 @@ inline constexpr const char* kPingFolder = "/opt/varden/tolk/bin/";
 
 // Folder, with trailing slash, of the files that capture what the pings' commands print.
 // Its users know it by this name, reserved or not.
-// NOLINTNEXTLINE(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp)
+// NOLINTNEXTLINE(bugprone-reserved-identifier)
 inline std::string _tmp_file_path;

@@ -478,7 +478,7 @@ TEST_F(Mutations, OfAValueAreReadAsWritten)
     constexpr int kMutations = 1000;
     constexpr unsigned long kSeed = 7;
     // The same at each run.
-    std::mt19937_64 random(kSeed); // NOLINT(cert-msc32-c,cert-msc51-cpp)
+    std::mt19937_64 random(kSeed); // NOLINT(cert-msc51-cpp)
     const std::string old = "timeout -k 5 60 service redis-server stop";
     const std::size_t place = sample.find(old);
     ASSERT_NE(place, std::string::npos);
