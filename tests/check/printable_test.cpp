@@ -6,7 +6,7 @@
 
 #include <gtest/gtest.h>
 
-using namespace check;
+using namespace tools;
 
 namespace {
 

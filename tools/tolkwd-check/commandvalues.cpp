@@ -33,7 +33,7 @@ std::string runinstead(const serviceview& view, field which)
     }
     const std::string verb = which == &service::startcmd ? "start" : "stop";
     return "a command: nothing " + verb + "s the service; only NULL, in these four letters, is " +
-           inquotes("service " + view.record->name.str() + " " + verb);
+           tools::inquotes("service " + view.record->name.str() + " " + verb);
 }
 
 void checkspelling(const serviceview& view, field which, findings& found)
@@ -126,7 +126,7 @@ void checkbounds(const serviceview& view, bool monitored, findings& found)
     }
     if (!unbounded.empty()) {
         found.add("unbounded-command", severity::note, placeof(view, &service::name),
-                  "no time limit for " + unbounded + " of " + inquotes(record.name.str()) +
+                  "no time limit for " + unbounded + " of " + tools::inquotes(record.name.str()) +
                       ": while one of them hangs, no service is recovered; put \"timeout -k 5 60\" "
                       "before what may hang");
     }

@@ -3,25 +3,13 @@
 #include <algorithm>
 #include <array>
 
-#include "printable.h"
+#include "textjson.h"
 
 namespace check {
 
 namespace {
 
 using nlohmann::ordered_json;
-
-std::string hexdigits(std::string_view bytes)
-{
-    constexpr std::string_view kDigits = "0123456789abcdef";
-    std::string digits;
-    for (const char byte : bytes) {
-        const auto value = static_cast<unsigned char>(byte);
-        digits += kDigits[value >> 4U];
-        digits += kDigits[value & 0xfU];
-    }
-    return digits;
-}
 
 std::string_view wordof(severity level)
 {
@@ -38,7 +26,7 @@ ordered_json findingjson(const sourcetext& source, const finding& found)
         result["column"] = where.column;
         result["offset"] = std::min(found.place, source.text().size());
     }
-    result["message"] = textjson(found.message);
+    result["message"] = tools::textjson(found.message);
     return result;
 }
 
@@ -46,7 +34,7 @@ ordered_json recordjson(const service& record)
 {
     ordered_json result = ordered_json::object();
     for (const fieldelement& field : kFieldElements) {
-        result[std::string(field.name)] = textjson((record.*field.field).str());
+        result[std::string(field.name)] = tools::textjson((record.*field.field).str());
     }
     return result;
 }
@@ -62,14 +50,6 @@ ordered_json targetjson(const targetview& target)
 
 } // namespace
 
-ordered_json textjson(std::string_view text)
-{
-    if (isutf8(text)) {
-        return std::string(text);
-    }
-    return {{"hex", hexdigits(text)}};
-}
-
 ordered_json resultjson(const std::string& name, const sourcetext& source, const daemonview& view,
                         const std::vector<finding>& found)
 {
@@ -84,7 +64,7 @@ ordered_json resultjson(const std::string& name, const sourcetext& source, const
         }
     }
     return {{"version", kFormatVersion},
-            {"file", textjson(name)},
+            {"file", tools::textjson(name)},
             {"loaded", view.loaded},
             {"findings", list},
             {"targets", targets}};

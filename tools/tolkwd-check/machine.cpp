@@ -54,15 +54,16 @@ private:
         if (const filefacts& facts = files.of(folder); facts.found == presence::kMissing) {
             found.add(
                 "ping-folder", severity::warning, kNoPlace,
-                "there is no folder " + inquotes(_tmp_file_path) +
+                "there is no folder " + tools::inquotes(_tmp_file_path) +
                     " on this machine: what pings and checks print has nowhere to go, so "
                     "every one fails, and every service is restarted and given up; make it as "
                     "root");
         } else if (facts.found == presence::kThere && !facts.folder) {
             found.add("ping-folder", severity::warning, kNoPlace,
-                      inquotes(folder) + " is no folder: what pings and checks print has nowhere "
-                                         "to go, so every one fails, and every service is "
-                                         "restarted and given up");
+                      tools::inquotes(folder) +
+                          " is no folder: what pings and checks print has nowhere "
+                          "to go, so every one fails, and every service is "
+                          "restarted and given up");
         }
         exposed(folder, kNoPlace, "the folder of what pings and checks print");
     }
@@ -87,7 +88,7 @@ private:
         if (files.of(real).exposed && told.insert(real).second) {
             found.add(
                 "writable-file", level, place,
-                inquotes(real) + ", " + std::string(what) +
+                tools::inquotes(real) + ", " + std::string(what) +
                     ", can be written by others than root, who so can have the daemon run anything "
                     "as root; make root its owner and the only one who may write it");
         }
@@ -133,7 +134,7 @@ private:
             name.front() != '/' ? ", which is not there seen from the daemon's folder, /: "
             : files.of(name).found == presence::kThere ? ", which is no program: "
                                                        : ", which is not there: ";
-        return what + "any process called " + inquotes(name.substr(slash + 1)) +
+        return what + "any process called " + tools::inquotes(name.substr(slash + 1)) +
                " is looked at instead; " + withoutprocess(name);
     }
 
@@ -141,7 +142,7 @@ private:
     {
         return "where there is no process, the thresholds see nothing and each check writes an "
                "ERROR line; try " +
-               inquotes("pidof " + name) + " while the service runs";
+               tools::inquotes("pidof " + name) + " while the service runs";
     }
 
     void checkservice(const serviceview& view, bool asked)
@@ -203,7 +204,7 @@ private:
                   "restarted and given up";
         found.add("command-missing", check ? severity::error : severity::warning,
                   placeof(view, which),
-                  fieldof(view, which) + " runs " + inquotes(named.name) +
+                  fieldof(view, which) + " runs " + tools::inquotes(named.name) +
                       ", which is no program of this machine: " + consequence +
                       "; correct the name, or install the program");
     }

@@ -34,6 +34,7 @@
 #include "shape.h"
 #include "sourcetext.h"
 #include "surroundings.h"
+#include "terminal.h"
 #include "values.h"
 #include "wdLocalLog_linux.h"
 #include "wdsettings.h"
@@ -41,9 +42,6 @@
 namespace {
 
 using namespace check;
-
-constexpr int kUsageStatus = 64;
-constexpr int kFailureStatus = 70; // of the checker itself, not of the file
 
 struct options {
     std::string file;
@@ -56,15 +54,6 @@ struct options {
     bool yes = false;
     bool json = false;
 };
-
-bool colourwanted()
-{
-    const auto set = [](const char* name) {
-        const char* value = std::getenv(name);
-        return value != nullptr ? std::string(value) : std::string();
-    };
-    return isatty(STDOUT_FILENO) != 0 && set("NO_COLOR").empty() && set("TERM") != "dumb";
-}
 
 // `text` in lines that a terminal shows whole.
 std::string folded(std::string_view text)
@@ -97,20 +86,10 @@ int listrules()
     return 0;
 }
 
-// The exit status, once all that was written has been taken.
-int delivered(int status)
-{
-    std::cout.flush();
-    if (!std::cout) {
-        throw std::runtime_error("the output cannot be written");
-    }
-    return status;
-}
-
 // Of a word on the command line that it does not understand, CLI11 repeats every byte.
 std::string refusal(const CLI::App* /*app*/, const CLI::Error& error)
 {
-    return printable(error.what()) + "\nRun with --help for more information.\n";
+    return tools::printable(error.what()) + "\nRun with --help for more information.\n";
 }
 
 // Ends the process where the command line is wrong, or asks for nothing but help.
@@ -121,7 +100,7 @@ options parse(int argc, char** argv)
     options chosen;
     const CLI::Validator arule(
         [](std::string& name) {
-            return isrule(name) ? std::string() : "no rule is named " + inquotes(name);
+            return isrule(name) ? std::string() : "no rule is named " + tools::inquotes(name);
         },
         "", "rule");
     app.add_option("FILE", chosen.file, "The configuration; - for standard input");
@@ -149,7 +128,7 @@ options parse(int argc, char** argv)
             throw CLI::RequiredError("FILE");
         }
     } catch (const CLI::ParseError& error) {
-        std::exit(app.exit(error) == 0 ? delivered(0) : kUsageStatus);
+        std::exit(app.exit(error) == 0 ? tools::delivered(0) : tools::kUsageStatus);
     }
     return chosen;
 }
@@ -203,7 +182,7 @@ int unreadable(const options& chosen, const std::string& reason)
         addparts(result, chosen, {}, {});
         std::cout << result.dump(2) << '\n';
     } else {
-        writefindings(std::cout, chosen.file, nothing, sorted, colourwanted());
+        writefindings(std::cout, chosen.file, nothing, sorted, tools::colourwanted());
     }
     return statusof(sorted);
 }
@@ -215,7 +194,7 @@ int checkfile(const options& chosen, const sourcetext& source, const std::string
     const daemonview view = readasdaemon(source.text());
     if (chosen.probe && !probeconfirmed(chosen, view)) {
         std::cerr << "nothing was run\n";
-        return kUsageStatus;
+        return tools::kUsageStatus;
     }
     checkshape(source, view, found);
     checkvalues(view, found);
@@ -236,7 +215,7 @@ int checkfile(const options& chosen, const sourcetext& source, const std::string
         addparts(result, chosen, plan, probes);
         std::cout << result.dump(2) << '\n';
     } else {
-        const bool colour = colourwanted();
+        const bool colour = tools::colourwanted();
         writefindings(std::cout, chosen.file, source, sorted, colour);
         // An empty line between the parts.
         bool written = !sorted.empty();
@@ -257,10 +236,10 @@ int checkfile(const options& chosen, const sourcetext& source, const std::string
 int guarded(const std::function<int()>& work)
 {
     try {
-        return delivered(work());
+        return tools::delivered(work());
     } catch (const std::exception& error) {
         (void)std::fprintf(stderr, "tolkwd-check: %s\n", error.what());
-        return kFailureStatus;
+        return tools::kFailureStatus;
     }
 }
 

@@ -68,9 +68,10 @@ void checkrating(const serviceview& view, findings& found)
             continue;
         }
         found.add("name-keyword", severity::warning, placeof(view, &service::name),
-                  "the name " + inquotes(name) + " holds a word that decides: the status line " +
-                      inquotes(line) + " with exit status " + std::to_string(each.state) +
-                      " is taken for " + std::string(consequence(rating)));
+                  "the name " + tools::inquotes(name) +
+                      " holds a word that decides: the status line " + tools::inquotes(line) +
+                      " with exit status " + std::to_string(each.state) + " is taken for " +
+                      std::string(consequence(rating)));
         return;
     }
 }
@@ -83,7 +84,7 @@ void checkname(const serviceview& view, findings& found)
     }
     if (!isplainname(name)) {
         found.add("service-name", severity::error, placeof(view, &service::name),
-                  "the name " + inquotes(name) +
+                  "the name " + tools::inquotes(name) +
                       " cannot be a service's: it stands in a shell command and in a file's name, "
                       "so it may hold letters, digits and . _ @ : + - only, and not begin with -");
     } else if (holdsratedword(name)) {
@@ -115,8 +116,8 @@ private:
         const std::string& other = owners.emplace(path, name).first->second;
         if (other != name) {
             found.add("shared-ping-file", severity::error, placeof(view, &service::name),
-                      inquotes(name) + " and " + inquotes(other) +
-                          " write their answers to one file, " + inquotes(path) +
+                      tools::inquotes(name) + " and " + tools::inquotes(other) +
+                          " write their answers to one file, " + tools::inquotes(path) +
                           ": each may get the other's; rename one of them");
         }
     }
@@ -139,7 +140,7 @@ public:
         bool& watched = known[record.name.str()].watched;
         if (monitored && watched) {
             found.add("duplicate-service", severity::error, placeof(view, &service::name),
-                      inquotes(record.name.str()) +
+                      tools::inquotes(record.name.str()) +
                           " is watched by an earlier target already: both ask it through one file "
                           "and both recover it; watch each service in one target only");
         }
@@ -173,7 +174,7 @@ private:
                       fieldof(view, which) +
                           " is another command than where the file names this "
                           "service before: " +
-                          inquotes(first.command) +
+                          tools::inquotes(first.command) +
                           "; which one is run depends on the target that is recovered");
         }
     }

@@ -2,7 +2,7 @@
 
 #include <nlohmann/json.hpp>
 
-#include "json.h"
+#include "textjson.h"
 
 namespace check {
 
@@ -51,7 +51,7 @@ ordered_json checkjson(const std::optional<checkplan>& check)
     if (!check) {
         return nullptr;
     }
-    return {{"command", textjson(check->command)},
+    return {{"command", tools::textjson(check->command)},
             {"every", timejson(check->every)},
             {"skips", check->skips < 0 ? ordered_json(nullptr) : ordered_json(check->skips)},
             {"busy", wordof(check->busy)},
@@ -64,9 +64,9 @@ ordered_json checkjson(const std::optional<checkplan>& check)
 
 ordered_json stepjson(const recoverystep& step)
 {
-    return {{"service", textjson(step.service)},
+    return {{"service", tools::textjson(step.service)},
             {"does", step.stops ? "stop" : "start"},
-            {"command", textjson(step.command)},
+            {"command", tools::textjson(step.command)},
             {"unless", step.unlessdown ? ordered_json("down") : ordered_json(nullptr)}};
 }
 
@@ -100,24 +100,24 @@ ordered_json outagejson(const outageplan& outage)
             {"givenup", timejson(outage.givenup)},
             {"unproven", outage.unproven},
             {"log",
-             {{"noticed", textjson(outage.log.noticed)},
-              {"begins", textjson(outage.log.begins)},
-              {"recovered", textjson(outage.log.recovered)},
-              {"givenup", textjson(outage.log.givenup)}}}};
+             {{"noticed", tools::textjson(outage.log.noticed)},
+              {"begins", tools::textjson(outage.log.begins)},
+              {"recovered", tools::textjson(outage.log.recovered)},
+              {"givenup", tools::textjson(outage.log.givenup)}}}};
 }
 
 ordered_json targetjson(const targetplan& plan)
 {
-    return {
-        {"name", textjson(plan.name)},
-        {"program", textjson(plan.program)},
-        {"state", wordof(plan.state)},
-        {"attempts", plan.attempts},
-        {"status", {{"command", textjson(plan.statuscommand)}, {"every", timejson(plan.every)}}},
-        {"check", checkjson(plan.check)},
-        {"recovery", listjson(plan.recovery, stepjson)},
-        {"outages", listjson(plan.outages, outagejson)},
-        {"refresh", {{"seconds", plan.refresh}, {"others", plan.othersround.value_or(0)}}}};
+    return {{"name", tools::textjson(plan.name)},
+            {"program", tools::textjson(plan.program)},
+            {"state", wordof(plan.state)},
+            {"attempts", plan.attempts},
+            {"status",
+             {{"command", tools::textjson(plan.statuscommand)}, {"every", timejson(plan.every)}}},
+            {"check", checkjson(plan.check)},
+            {"recovery", listjson(plan.recovery, stepjson)},
+            {"outages", listjson(plan.outages, outagejson)},
+            {"refresh", {{"seconds", plan.refresh}, {"others", plan.othersround.value_or(0)}}}};
 }
 
 } // namespace

@@ -8,14 +8,12 @@
 #include <string_view>
 
 #include "printable.h"
+#include "terminal.h"
 #include "wdmonitortarget.h"
 
 namespace check {
 
 namespace {
-
-constexpr std::string_view kBold = "\033[1m";
-constexpr std::string_view kPlain = "\033[m";
 
 // Of what stands before the text of a line: the names of a target's parts, and the seconds of a
 // time line.
@@ -64,7 +62,11 @@ std::string message(std::string_view level, const std::string& text)
             end = " ...";
         }
     }
-    return std::string(level).append(" \"").append(printable(shown)).append(end).append("\"");
+    return std::string(level)
+        .append(" \"")
+        .append(tools::printable(shown))
+        .append(end)
+        .append("\"");
 }
 
 // Writes what a target's time line tells.
@@ -86,7 +88,7 @@ private:
 
 void writenotasked(std::ostream& out, const targetplan& plan)
 {
-    out << "  never asked, for maxattemptofwakeup is " << inquotes(plan.attemptstext);
+    out << "  never asked, for maxattemptofwakeup is " << tools::inquotes(plan.attemptstext);
     if (plan.state == watching::givenup) {
         out << ", which counts as 0.\n"
             << "  It is given up as soon as watching begins, and again after each refresh:\n"
@@ -134,10 +136,10 @@ void writeasking(std::ostream& out, const targetplan& plan)
 {
     timeline lines(out);
     out << "  asked     " << each(plan.every) << ":\n";
-    lines.more("  " + printable(plan.statuscommand));
+    lines.more("  " + tools::printable(plan.statuscommand));
     if (plan.check) {
         out << "  checked   each time it was asked and runs:\n";
-        lines.more("  " + printable(plan.check->command));
+        lines.more("  " + tools::printable(plan.check->command));
         writebusiness(lines, *plan.check);
     } else {
         out << "  checked   never: functionalpingcmd is " << kNoCommand << '\n';
@@ -155,8 +157,8 @@ void writerecovery(std::ostream& out, const targetplan& plan)
         lines.more("  " + std::to_string(++place) + ". " +
                    (step.command.empty()
                         ? "nothing is run to " + std::string(step.stops ? "stop " : "start ") +
-                              printable(step.service)
-                        : printable(step.command)));
+                              tools::printable(step.service)
+                        : tools::printable(step.command)));
         if (step.unlessdown) {
             lines.more("     left out when the last status line said that it does not run");
         }
@@ -301,10 +303,10 @@ void writeoutage(std::ostream& out, const targetplan& plan, const outageplan& ou
 
 void writetarget(std::ostream& out, const targetplan& plan, bool colour)
 {
-    const std::string name = plan.name.empty() ? "(no name)" : printable(plan.name);
-    out << '\n' << (colour ? kBold : "") << name << (colour ? kPlain : "");
+    const std::string name = plan.name.empty() ? "(no name)" : tools::printable(plan.name);
+    out << '\n' << tools::coloured(tools::kBold, name, colour);
     if (!plan.program.empty()) {
-        out << " (" << printable(plan.program) << ')';
+        out << " (" << tools::printable(plan.program) << ')';
     }
     out << '\n';
     if (plan.state != watching::kept) {

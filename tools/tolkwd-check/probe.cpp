@@ -33,7 +33,7 @@ public:
 
     void show(const std::string& text)
     {
-        const std::size_t width = characters(text);
+        const std::size_t width = tools::characters(text);
         const std::size_t blanks = shown > width ? shown - width : 0;
         out.tell('\r' + text + std::string(blanks, ' '));
         shown = width;
@@ -143,10 +143,10 @@ targetprobe trytarget(const service& svc, progress& shown)
                       .status = {},
                       .check = {},
                       .process = {}};
-    shown.show("waiting for the status command of " + inquotes(probe.name));
+    shown.show("waiting for the status command of " + tools::inquotes(probe.name));
     probe.status = trystatus(svc);
     if (ischecked(svc)) {
-        shown.show("waiting for the check of " + inquotes(probe.name));
+        shown.show("waiting for the check of " + tools::inquotes(probe.name));
         probe.check = trycheck(svc);
     }
     return probe;
@@ -203,15 +203,16 @@ std::string answerwords(const commandprobe& tried)
     if (tried.firstline.empty()) {
         return tried.reason.empty() ? "answers nothing" : "answers " + tried.reason;
     }
-    return "answers " + inquotes(tried.firstline) +
+    return "answers " + tools::inquotes(tried.firstline) +
            (tried.reason.empty() ? "" : " (" + tried.reason + ")");
 }
 
 void findstatus(const targetview& target, const targetprobe& probe, findings& found)
 {
     const std::size_t place = placeof(target, &service::name);
-    const std::string name = inquotes(probe.name);
-    const std::string answer = inquotes(probe.status.command) + ' ' + answerwords(probe.status);
+    const std::string name = tools::inquotes(probe.name);
+    const std::string answer =
+        tools::inquotes(probe.status.command) + ' ' + answerwords(probe.status);
     switch (probe.status.result) {
     case kServiceUnknown:
         found.add("probe-status", severity::error, place,
@@ -241,7 +242,7 @@ void findcheck(const targetview& target, const targetprobe& probe, findings& fou
         return;
     }
     const std::size_t place = placeof(target, &service::functionalpingcmd);
-    const std::string about = " of the service " + inquotes(probe.name) + ' ';
+    const std::string about = " of the service " + tools::inquotes(probe.name) + ' ';
     const std::string answer = answerwords(*probe.check);
     if (probe.check->result == kCommandNotFound) {
         found.add("probe-check", severity::error, place,
@@ -282,11 +283,11 @@ void findprocess(const targetview& target, const targetprobe& probe, findings& f
     if (!process.counts) {
         return;
     }
-    const std::string name = inquotes(probe.name);
+    const std::string name = tools::inquotes(probe.name);
     if (process.pid == 0 && probe.status.result == kServiceRunning) {
         found.add("probe-process", severity::warning, placeof(target, &service::binarypath),
                   "the service " + name + " runs, but pidof finds no process of " +
-                      inquotes(probe.binarypath) +
+                      tools::inquotes(probe.binarypath) +
                       ": the daemon would compare old figures with the thresholds, at first 0: "
                       "correct binarypath");
     }

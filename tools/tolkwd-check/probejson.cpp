@@ -2,7 +2,7 @@
 
 #include <nlohmann/json.hpp>
 
-#include "json.h"
+#include "textjson.h"
 #include "wdmonitorthread_linux.h"
 
 namespace check {
@@ -41,8 +41,8 @@ std::string_view checkword(int result)
 
 ordered_json commandjson(const commandprobe& tried, std::string_view result)
 {
-    return {{"command", textjson(tried.command)},
-            {"line", textjson(tried.firstline)},
+    return {{"command", tools::textjson(tried.command)},
+            {"line", tools::textjson(tried.firstline)},
             {"readable", tried.readable},
             {"exit-status", tried.state < 0 ? ordered_json() : ordered_json(tried.state)},
             {"seconds", tried.seconds},
@@ -75,7 +75,7 @@ ordered_json probejson(const std::vector<targetprobe>& probes)
         const ordered_json check = probe.check
                                        ? commandjson(*probe.check, checkword(probe.check->result))
                                        : ordered_json();
-        list.push_back({{"name", textjson(probe.name)},
+        list.push_back({{"name", tools::textjson(probe.name)},
                         {"status", commandjson(probe.status, statusword(probe.status.result))},
                         {"check", check},
                         {"process", processjson(probe.process)}});

@@ -8,6 +8,7 @@
 
 #include "fields.h"
 #include "printable.h"
+#include "terminal.h"
 #include "wdmonitorthread_linux.h"
 
 namespace check {
@@ -52,7 +53,7 @@ verdict checkverdict(int result)
 
 std::string_view colourof(const verdict& verdict)
 {
-    return verdict.good ? "\033[1;32m" : "\033[1;31m";
+    return verdict.good ? tools::kGreen : tools::kRed;
 }
 
 // With one digit behind the point, or none where that is 0.
@@ -88,20 +89,13 @@ std::string linewords(const commandprobe& tried)
         return "nothing on the first line";
     }
     const bool cut = tried.firstline.size() > kShownBytes;
-    return '"' + printable(tried.firstline.substr(0, kShownBytes)) + (cut ? "..." : "\"");
+    return '"' + tools::printable(tried.firstline.substr(0, kShownBytes)) + (cut ? "..." : "\"");
 }
 
 void writecommand(std::ostream& out, std::string_view label, const commandprobe& tried,
                   const verdict& verdict, bool colour)
 {
-    out << label;
-    if (colour) {
-        out << colourof(verdict);
-    }
-    out << verdict.words;
-    if (colour) {
-        out << "\033[m";
-    }
+    out << label << tools::coloured(colourof(verdict), verdict.words, colour);
     if (!tried.reason.empty()) {
         out << ": " << tried.reason;
     }
@@ -162,7 +156,7 @@ void writeprocess(std::ostream& out, const targetprobe& probe)
     const processprobe& process = probe.process;
     out << "  process    ";
     if (process.pid == 0) {
-        out << "pidof finds none of " << inquotes(probe.binarypath) << '\n';
+        out << "pidof finds none of " << tools::inquotes(probe.binarypath) << '\n';
         return;
     }
     out << process.pid << ": " << figurewords("threads", process.threads, "", nowords) << ", "
@@ -175,7 +169,7 @@ std::string username()
 {
     const uid_t user = geteuid();
     const passwd* const entry = getpwuid(user);
-    return entry != nullptr ? printable(entry->pw_name) : "user " + std::to_string(user);
+    return entry != nullptr ? tools::printable(entry->pw_name) : "user " + std::to_string(user);
 }
 
 std::string counted(std::size_t count, const std::string& one)
@@ -197,7 +191,8 @@ std::optional<std::string> probequestion(const daemonview& view)
     std::string commands;
     for (const targetview& target : view.targets) {
         if (ischecked(*target.monitored.record) && ++checks <= kShownChecks) {
-            commands += "  " + inquotes(target.monitored.record->functionalpingcmd.str()) + '\n';
+            commands +=
+                "  " + tools::inquotes(target.monitored.record->functionalpingcmd.str()) + '\n';
         }
     }
     if (checks > kShownChecks) {
@@ -217,13 +212,14 @@ std::optional<std::string> probeobstacle(const daemonview& view)
     for (const targetview& target : view.targets) {
         const std::string& name = target.monitored.record->name;
         if (!name.empty() && !isplainname(name)) {
-            return "the name " + inquotes(name) + std::string(kOtherwise) + "its status command";
+            return "the name " + tools::inquotes(name) + std::string(kOtherwise) +
+                   "its status command";
         }
         // A blank only makes two names of it.
         std::string path = target.monitored.record->binarypath;
         std::erase(path, ' ');
         if (!isplainpath(path)) {
-            return "the binarypath of " + inquotes(name) + std::string(kOtherwise) + "pidof";
+            return "the binarypath of " + tools::inquotes(name) + std::string(kOtherwise) + "pidof";
         }
     }
     return std::nullopt;
@@ -232,8 +228,7 @@ std::optional<std::string> probeobstacle(const daemonview& view)
 void writeprobe(std::ostream& out, const std::vector<targetprobe>& probes, bool colour)
 {
     for (const targetprobe& probe : probes) {
-        out << (colour ? "\033[1m" : "") << printable(probe.name) << (colour ? "\033[m" : "")
-            << '\n';
+        out << tools::coloured(tools::kBold, tools::printable(probe.name), colour) << '\n';
         writecommand(out, "  status     ", probe.status, statusverdict(probe.status.result),
                      colour);
         if (probe.check) {

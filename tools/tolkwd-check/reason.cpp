@@ -86,13 +86,13 @@ std::string asfound(std::string_view line, std::string_view word)
          place = line.find(word, place + 1)) {
         const std::string_view whole = wholeword(line, word, place);
         if (whole == word) {
-            return inquotes(word);
+            return tools::inquotes(word);
         }
         if (first.empty()) {
             first = whole;
         }
     }
-    return inquotes(word) + " inside " + inquotes(first);
+    return tools::inquotes(word) + " inside " + tools::inquotes(first);
 }
 
 std::string explained(const wordrule& rule, std::string_view line)
@@ -103,7 +103,7 @@ std::string explained(const wordrule& rule, std::string_view line)
         text += (simple ? " and " : ", and ") + asfound(line, rule.also);
     }
     if (!rule.without.empty()) {
-        text += " and not " + inquotes(rule.without);
+        text += " and not " + tools::inquotes(rule.without);
     }
     return text;
 }

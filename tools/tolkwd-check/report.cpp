@@ -5,6 +5,7 @@
 #include <string_view>
 
 #include "printable.h"
+#include "terminal.h"
 
 namespace check {
 
@@ -23,26 +24,17 @@ struct look {
     std::string_view colour;
 };
 
-constexpr std::string_view kBold = "\033[1m";
-constexpr std::string_view kGreen = "\033[1;32m";
-constexpr std::string_view kPlain = "\033[m";
-
 look lookof(severity level)
 {
     switch (level) {
     case severity::error:
-        return {"error", "\033[1;31m"};
+        return {"error", tools::kRed};
     case severity::warning:
-        return {"warning", "\033[1;35m"};
+        return {"warning", tools::kMagenta};
     case severity::note:
         break;
     }
-    return {"note", "\033[1;36m"};
-}
-
-std::string in(std::string_view colour, std::string_view text, bool wanted)
-{
-    return wanted ? std::string(colour).append(text).append(kPlain) : std::string(text);
+    return {"note", tools::kCyan};
 }
 
 bool continues(char byte)
@@ -79,13 +71,13 @@ void writesource(std::ostream& out, const sourcetext& source, std::size_t place,
         shown.remove_suffix(1);
     }
     const std::string cut = begin > 0 ? "..." : "";
-    const std::string before = cut + printable(shown.substr(0, column - begin));
+    const std::string before = cut + tools::printable(shown.substr(0, column - begin));
     std::string number = std::to_string(source.linenumber(place));
     number.insert(0, kNumberWidth - std::min(kNumberWidth, number.size()), ' ');
-    out << number << " | " << cut << printable(shown) << (end < line.text.size() ? "..." : "")
-        << '\n'
-        << std::string(number.size(), ' ') << " | " << below(before) << in(kGreen, "^", colour)
-        << '\n';
+    out << number << " | " << cut << tools::printable(shown)
+        << (end < line.text.size() ? "..." : "") << '\n'
+        << std::string(number.size(), ' ') << " | " << below(before)
+        << tools::coloured(tools::kGreen, "^", colour) << '\n';
 }
 
 void writefinding(std::ostream& out, const std::string& file, const sourcetext& source,
@@ -96,8 +88,9 @@ void writefinding(std::ostream& out, const std::string& file, const sourcetext& 
     const std::string prefix =
         file + ":" + std::to_string(where.line) + ":" + std::to_string(where.column) + ":";
     const look look = lookof(each.level);
-    out << in(kBold, prefix, colour) << ' ' << in(look.colour, std::string(look.word) + ":", colour)
-        << ' ' << printable(each.message) << " [" << each.rule << "]\n";
+    out << tools::coloured(tools::kBold, prefix, colour) << ' '
+        << tools::coloured(look.colour, std::string(look.word) + ":", colour) << ' '
+        << tools::printable(each.message) << " [" << each.rule << "]\n";
     if (placed && !source.text().empty()) {
         writesource(out, source, each.place, colour);
     }
@@ -108,7 +101,7 @@ void writefinding(std::ostream& out, const std::string& file, const sourcetext& 
 void writefindings(std::ostream& out, const std::string& name, const sourcetext& source,
                    const std::vector<finding>& found, bool colour)
 {
-    const std::string file = printable(name);
+    const std::string file = tools::printable(name);
     std::map<std::string_view, std::size_t> count;
     for (const finding& each : found) {
         if (each.place == kNoPlace || ++count[each.rule] <= kShownOfARule) {

@@ -147,7 +147,7 @@ std::string tellcomment(std::string_view text)
 std::string tellunknown(const oddity& odd)
 {
     const std::string_view meant = similar(odd.name);
-    const std::string told = inquotes(odd.name) + " is no element of this file";
+    const std::string told = tools::inquotes(odd.name) + " is no element of this file";
     return meant.empty() ? told + " and is never closed"
                          : told + ", did you mean " + tag(meant) + "? It is never closed";
 }
@@ -167,7 +167,7 @@ std::string tell(const oddity& odd, std::string_view text)
     case oddkind::attribute:
         return "the daemon does not know attributes: it takes the whole tag for a name";
     case oddkind::entity:
-        return inquotes(odd.name) + " is taken as it stands";
+        return tools::inquotes(odd.name) + " is taken as it stands";
     case oddkind::emptytag:
         return "a tag without a name, as every tag that ends in \"/>\", makes the whole load fail: "
                "nothing is watched until the next refresh";
@@ -178,12 +178,12 @@ std::string tell(const oddity& odd, std::string_view text)
     case oddkind::brokentag:
         return "the \">\" of this tag is missing";
     case oddkind::mismatched:
-        return "this closes " + tag(brief(odd.other)) + ", though it is named " +
-               inquotes(odd.name);
+        return "this closes " + tag(tools::brief(odd.other)) + ", though it is named " +
+               tools::inquotes(odd.name);
     case oddkind::strayclosing:
-        return inquotes(odd.name) + " is not open here: this closes what is open";
+        return tools::inquotes(odd.name) + " is not open here: this closes what is open";
     case oddkind::lateclosing:
-        return inquotes(odd.name) + " closes here what had to end before another one began";
+        return tools::inquotes(odd.name) + " closes here what had to end before another one began";
     case oddkind::unclosed:
         return tag(odd.name) + " is not closed";
     case oddkind::misplaced:
@@ -234,7 +234,7 @@ std::string cureof(const oddity& odd)
     case oddkind::instruction:
         return "put it there, or leave it out";
     case oddkind::attribute:
-        return "write " + tag(brief(odd.name));
+        return "write " + tag(tools::brief(odd.name));
     case oddkind::emptytag:
         return "write NULL for no command, or a number";
     case oddkind::unknown:
@@ -242,7 +242,7 @@ std::string cureof(const oddity& odd)
     case oddkind::lateclosing:
         return "move it there";
     case oddkind::mismatched:
-        return "write </" + brief(odd.other) + ">";
+        return "write </" + tools::brief(odd.other) + ">";
     case oddkind::unclosed:
         return "write </" + std::string(odd.name) + "> where it ends";
     case oddkind::misplaced:
@@ -332,7 +332,7 @@ private:
     [[nodiscard]] std::string titleof(const writtentarget& written) const
     {
         const std::string& name = named(written.monitored());
-        return (name.empty() ? "the target" : "target " + inquotes(name)) + " (" +
+        return (name.empty() ? "the target" : "target " + tools::inquotes(name)) + " (" +
                line(written.begin) + ")";
     }
 
@@ -415,7 +415,7 @@ private:
             if (written == nullptr || !taken.emplace(written, &each).second) {
                 const std::size_t before = oddwithin(0, each.end).second;
                 harm(before > 0 ? before - 1 : npos, each.begin,
-                     "a service named " + inquotes(each.monitored.record->name.str()) +
+                     "a service named " + tools::inquotes(each.monitored.record->name.str()) +
                          " is watched, which nobody meant");
             }
         }
@@ -450,7 +450,7 @@ private:
             }
             if (same == dependents.end()) {
                 harm(blame(each.begin, each.end, written), each.begin,
-                     "dependent " + inquotes(named(&each)) + " of " + titleof(written) +
+                     "dependent " + tools::inquotes(named(&each)) + " of " + titleof(written) +
                          " is lost: no recovery restarts it");
             } else {
                 ++matched;
@@ -483,12 +483,12 @@ private:
             } else {
                 auto& [place, told] = changed[blame(each->begin, each->end, target)];
                 place = told.empty() ? each->begin : place;
-                told.push_back(std::string(nameof(field)) + " becomes " + inquotes(value));
+                told.push_back(std::string(nameof(field)) + " becomes " + tools::inquotes(value));
             }
         }
         for (const auto& [odd, fields] : changed) {
             harm(odd, fields.place,
-                 "in " + inquotes(named(&written)) + " " + listed(fields.told, ", "));
+                 "in " + tools::inquotes(named(&written)) + " " + listed(fields.told, ", "));
         }
         if (!unused.empty()) {
             tellunused(written, unused);
@@ -503,7 +503,7 @@ private:
                 target->services.begin(), target->services.end(), element,
                 [](std::size_t wanted, const auto& each) { return wanted < each.begin; });
             if (behind != target->services.begin() && element < std::prev(behind)->end) {
-                return inquotes(named(&*std::prev(behind))) + " (" + line(element) + ")";
+                return tools::inquotes(named(&*std::prev(behind))) + " (" + line(element) + ")";
             }
         }
         return std::string(monitored ? "the service" : "the dependent") + " before it (" +
@@ -515,10 +515,10 @@ private:
         const std::string& value = valueof(*taken.record, field).str();
         const origin& from = taken.origins.at(field);
         const std::string effect = effectof(field, value);
-        std::string message =
-            std::string(nameof(field)) + " is missing in " + inquotes(named(&written)) + ": ";
+        std::string message = std::string(nameof(field)) + " is missing in " +
+                              tools::inquotes(named(&written)) + ": ";
         if (from.element != kNoPlace) {
-            message += "it is " + inquotes(value) + ", as in " +
+            message += "it is " + tools::inquotes(value) + ", as in " +
                        sourceof(from.element, written.monitored) +
                        (effect.empty() ? "" : ": " + effect);
         } else {
@@ -526,7 +526,7 @@ private:
             const std::string& later = valueof(last, field).str();
             message += "at the start it is empty" + (effect.empty() ? "" : " (" + effect + ")");
             if (!later.empty()) {
-                message += ", after a refresh " + inquotes(later) + ", as in the last " +
+                message += ", after a refresh " + tools::inquotes(later) + ", as in the last " +
                            (written.monitored ? "service" : "dependent") + " of the file";
             }
         }
@@ -540,15 +540,16 @@ private:
             names += (names.empty() ? "" : ", ") + std::string(nameof(field));
         }
         found.add("missing-field", severity::note, written.begin,
-                  inquotes(named(&written)) + " leaves out " + names +
+                  tools::inquotes(named(&written)) + " leaves out " + names +
                       ", which have no effect here");
     }
 
     void tellempty(const writtenfield& written, const writtenservice& in, const std::string& value)
     {
-        std::string message = std::string(nameof(written.field)) + " of " + inquotes(named(&in)) +
+        std::string message = std::string(nameof(written.field)) + " of " +
+                              tools::inquotes(named(&in)) +
                               " is empty: the daemon takes the text before it, " +
-                              (value.empty() ? "and here there is none" : inquotes(value));
+                              (value.empty() ? "and here there is none" : tools::inquotes(value));
         if (const std::string effect = effectof(written.field, value); !effect.empty()) {
             message += ": " + effect;
         }
@@ -564,7 +565,7 @@ private:
         found.add("missing-service", severity::error, written.begin,
                   "the target has no " + tag("wdmonitorservice") +
                       (name.empty() ? ": it watches a service without a name"
-                                    : ": it watches " + inquotes(name) +
+                                    : ": it watches " + tools::inquotes(name) +
                                           ", the service of the target before, once more"));
     }
 
@@ -577,7 +578,8 @@ private:
             if (each.monitored && first != nullptr) {
                 found.add("second-service", severity::error, each.begin,
                           "a second " + tag("wdmonitorservice") + " in the target of " +
-                              inquotes(named(first)) + ": only " + inquotes(named(&each)) +
+                              tools::inquotes(named(first)) + ": only " +
+                              tools::inquotes(named(&each)) +
                               " is watched; give it a target of its own");
             }
             first = each.monitored && first == nullptr ? &each : first;
@@ -595,7 +597,8 @@ private:
             const writtenfield*& before = seen.at(each.field);
             if (before != nullptr) {
                 found.add("duplicate-field", severity::warning, each.begin,
-                          std::string(nameof(each.field)) + " of " + inquotes(named(&written)) +
+                          std::string(nameof(each.field)) + " of " +
+                              tools::inquotes(named(&written)) +
                               " stands twice: this one counts, not that of " + line(before->begin));
             }
             before = &each;

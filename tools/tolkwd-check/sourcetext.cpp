@@ -63,7 +63,7 @@ position sourcetext::at(std::size_t place) const
         counted = {index, begins[index], 0};
     }
     const auto stretch = std::string_view(content).substr(counted.place, place - counted.place);
-    counted = {index, place, counted.characters + characters(stretch)};
+    counted = {index, place, counted.characters + tools::characters(stretch)};
     return {index + 1, counted.characters + 1};
 }
 

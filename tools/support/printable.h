@@ -5,7 +5,7 @@
 #include <string>
 #include <string_view>
 
-namespace check {
+namespace tools {
 
 // `text` with control characters, invisible characters that change the direction or the look of
 // text, and bytes that are not UTF-8 as \xNN or \u{NNNN}. A tab stays, for it keeps what stands
@@ -25,4 +25,4 @@ std::size_t characters(std::string_view text) noexcept;
 // Whether all of `text` is UTF-8. Any thread.
 bool isutf8(std::string_view text) noexcept;
 
-} // namespace check
+} // namespace tools

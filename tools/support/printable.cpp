@@ -4,7 +4,7 @@
 #include <cstdint>
 #include <cstdio>
 
-namespace check {
+namespace tools {
 
 namespace {
 
@@ -125,4 +125,4 @@ bool isutf8(std::string_view text) noexcept
     return true;
 }
 
-} // namespace check
+} // namespace tools
