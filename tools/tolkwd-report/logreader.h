@@ -1,0 +1,64 @@
+// Bytes of a log -> messages. Takes the file as the daemon writes it and the journal as journalctl
+// prints it (its short forms, cat, and export), in pieces of any size, in constant memory. Lines
+// that no tolkwd wrote, lines that are torn, and lines that go on with the message before are told
+// apart; nothing of what they hold does harm.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "message.h"
+
+namespace report {
+
+// What was read.
+struct readcount {
+    std::uint64_t bytes = 0;
+    std::uint64_t lines = 0;    // all
+    std::uint64_t messages = 0; // of the daemon's
+    std::uint64_t foreign = 0;  // lines of others; those that go on with a message are not counted
+    std::uint64_t torn = 0;     // beginnings and ends of lines that are not whole
+    std::uint64_t clockchanges = 0; // how often the clock went back by more than a minute
+    instant first;                  // of the first and the last message that has a time; both 0
+    instant last;                   // where there is none
+};
+
+// How much of what it reads a listener wants to hear.
+enum class wanted : std::uint8_t {
+    kAll,         // each message
+    kWhatMatters, // what may change a state; steps that tell nothing are counted only
+};
+
+class logreader {
+public:
+    using listener = std::function<void(const message&)>;
+
+    // Each message goes to `hear`, in the order of the log. The zone of the process (TZ) tells when
+    // the log's clock changes by an hour; read once, here.
+    logreader(wanted which, listener hear);
+    ~logreader();
+    logreader(const logreader&) = delete;
+    logreader& operator=(const logreader&) = delete;
+
+    // The next bytes. One thread. Messages are handed on once it is sure that they are whole.
+    void feed(std::string_view bytes);
+
+    // There is nothing more for now: hands on what was held back for lines that might follow it. A
+    // line without its newline stays held back.
+    void pause();
+
+    // The file ends here, another begins: a line without its newline is taken as it is.
+    void endfile();
+
+    [[nodiscard]] const readcount& count() const noexcept;
+
+private:
+    class work;
+    std::unique_ptr<work> self;
+};
+
+} // namespace report

@@ -1,0 +1,132 @@
+// Messages -> what became of each service. Follows thread ids to services within a generation of
+// monitor threads and across refreshes, where ids are used again, and keeps for each service its
+// state and its figures; what happens goes to a witness.
+//
+// What only debug lines tell, the log without them leaves open. Then:
+//   - Between its announcement and the first word about it a service is taken to be up.
+//   - A retry that succeeds leaves no message. When the silence after a failure has outlasted all
+//     the retries, or the thread speaks of something else, the service is taken to have come up at
+//     the last retry that there would have been, or when its thread spoke again, if that is
+//     earlier.
+//   - A check that succeeds leaves none either: the next word about the service tells.
+// Whatever begins by such a rule is marked as inferred.
+#pragma once
+
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "message.h"
+#include "state.h"
+
+namespace report {
+
+using serviceid = std::uint32_t; // an index, in the order in which the log names them
+
+// A stretch of one state.
+struct span {
+    state what = state::kNotWatched;
+    instant from;
+    instant to;            // of the last one: the end of the log
+    bool inferred = false; // no message says that it began, or when
+};
+
+// A stretch in which a service was unavailable, from its first failure until it was up again or no
+// longer watched.
+struct outage {
+    instant from;
+    std::optional<instant> to; // none: it lasts
+};
+
+// All that is known of one service, in constant memory. Times in seconds.
+struct account {
+    std::string name; // as the log has it; may hold anything
+    std::string path; // its binarypath; empty where the log does not tell
+    span now;         // the state it is in, up to the last message of the log
+    std::optional<outage> lastoutage;
+    std::uint64_t outages = 0;
+    std::uint64_t recoveriestried = 0;
+    std::uint64_t recoveriessuccessful = 0; // as the daemon says
+    std::uint64_t skippedchecks = 0;
+    std::uint64_t gaveup = 0;        // how often
+    std::int64_t outageseconds = 0;  // in all, the one that lasts included
+    std::int64_t watchedseconds = 0; // in all: every state but not-watched
+
+    // The share of the watched time in which the service was no outage, 0 to 1; none if there was
+    // no such time.
+    [[nodiscard]] std::optional<double> availability() const noexcept;
+};
+
+// What happened, for the history.
+enum class eventkind : std::uint8_t {
+    kWatched,   // a thread watches the service from now on
+    kUnwatched, // no longer
+    kState,     // by inference only: no message of its own
+    kFailed,    // a ping or check failed and will be retried
+    kRecoveryTried,
+    kRecovered,
+    kGaveUp,
+    kUnknown,       // unknown service, command not recognised
+    kSkipped,       // a check
+    kChecked,       // a check is made
+    kConfiguration, // load, refresh, a service that is not configured
+    kDaemon,        // it started, ended, or the clock changed
+    kFigures,       // of the process
+    kStep,          // all that debug lines tell
+};
+
+// As users write it behind --kind: "recovery-tried".
+std::string_view wordof(eventkind kind) noexcept;
+
+struct event {
+    eventkind kind = eventkind::kStep;
+    instant when;
+    std::optional<serviceid> service; // none: about the daemon, or a thread that is not known
+    std::optional<state> became;      // the state that it began
+    bool inferred = false;
+    const message* source = nullptr; // none: inferred. Lives until the witness returns
+};
+
+// What the tracker tells while it hears. Functions that are not set are not called.
+struct witness {
+    // In the order of the log, but that an inferred one comes when it is known and is dated when it
+    // happened.
+    std::function<void(const event&)> happened;
+    // A span that has come to its end. Those of one service come in order, touch each other, and
+    // are never empty.
+    std::function<void(serviceid, const span&)> ended;
+};
+
+class tracker {
+public:
+    explicit tracker(witness told);
+    ~tracker();
+    tracker(const tracker&) = delete;
+    tracker& operator=(const tracker&) = delete;
+
+    // The next message. One thread.
+    void hear(const message& said);
+
+    // What is known at `when`, which is not before the last message: draws the conclusions that
+    // silence up to then allows, and brings the open spans and all figures up to date. May be
+    // called again, and hear() after it; conclusions that a later message refutes are taken back.
+    // `final`: also ends the open spans for the witness; nothing may be called then but accounts().
+    void conclude(const instant& when, bool final);
+
+    // All services, in the order in which the log names them; valid until the next call. Up to date
+    // after conclude().
+    [[nodiscard]] const std::vector<account>& accounts() const noexcept;
+
+    // Whether the last load of the configuration failed, so that nothing is watched.
+    [[nodiscard]] bool loadfailed() const noexcept;
+
+private:
+    class work;
+    std::unique_ptr<work> self;
+};
+
+} // namespace report
