@@ -156,9 +156,7 @@ void checkParsed()
     if (wdlocallogpath.empty()) {
         refusecommandline("output log file path not specified");
     }
-    if (globalrefresh < kLeastRefreshSeconds) {
-        globalrefresh = kDefaultRefreshSeconds;
-    }
+    globalrefresh = refreshperiod(globalrefresh);
 }
 
 void set_tmp_file_path()

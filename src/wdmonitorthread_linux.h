@@ -86,9 +86,8 @@ struct pingoutcome {
 };
 
 // Runs the status command, or the functional check, of `svc` and reads what it printed, in the file
-// that it leaves in the pings' folder. Waits for
-// as long as it takes. Any thread; takes no lock: whoever pings while recoveries may run holds
-// pingreclock for reading meanwhile.
+// that it leaves in the pings' folder. Waits for as long as it takes. Any thread; takes no lock:
+// whoever pings while recoveries may run holds pingreclock for reading meanwhile.
 pingoutcome askstatus(const service& svc);
 pingoutcome askfunction(const service& svc);
 

@@ -15,6 +15,12 @@ inline std::string wdlocallogpath;
 inline constexpr int kLeastRefreshSeconds = 120;
 inline constexpr int kDefaultRefreshSeconds = 10800;
 
+// What a refresh period of so many seconds comes to, in seconds. Any thread.
+constexpr int refreshperiod(int seconds) noexcept
+{
+    return seconds < kLeastRefreshSeconds ? kDefaultRefreshSeconds : seconds;
+}
+
 // Refresh period in seconds ("-t"): after so many one-second ticks the configuration is read
 // afresh.
 inline int globalrefresh = 0;

@@ -17,8 +17,8 @@ enum class severity { note, warning, error };
 inline constexpr std::size_t kNoPlace = static_cast<std::size_t>(-1);
 
 struct finding {
-    std::size_t place;     // in bytes from the file's start, or kNoPlace
-    severity level;        //
+    std::size_t place; // in bytes from the file's start, or kNoPlace
+    severity level;
     std::string_view rule; // of rules.h
     std::string message; // one sentence or two without a full stop; may hold any bytes of the file
 };

@@ -207,9 +207,8 @@ int checkfile(const options& chosen, const sourcetext& source, const std::string
     }
     checkload(view, durationsof(probes), found);
     const auto sorted = found.sorted();
-    const int refresh =
-        chosen.refresh < kLeastRefreshSeconds ? kDefaultRefreshSeconds : chosen.refresh;
-    const auto plan = chosen.plan ? makeplan(view, refresh) : std::vector<targetplan>();
+    const auto plan =
+        chosen.plan ? makeplan(view, refreshperiod(chosen.refresh)) : std::vector<targetplan>();
     if (chosen.json) {
         auto result = resultjson(chosen.file, source, view, sorted);
         addparts(result, chosen, plan, probes);

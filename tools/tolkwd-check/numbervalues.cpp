@@ -12,17 +12,18 @@
 
 #include "ProcessStatistics_Linux.h"
 #include "fields.h"
+#include "units.h"
 #include "wdmonitorthread_linux.h"
 
 namespace check {
 
 namespace {
 
-enum class meaning { kPause, kAttempts, kSkips, kThreshold, kNothing };
+enum class numberkind { kPause, kAttempts, kSkips, kThreshold, kNothing };
 
 struct numberfield {
     field which;
-    meaning kind;
+    numberkind kind;
     std::string_view zero; // what 0 does
     std::string_view cure;
 };
@@ -30,22 +31,22 @@ struct numberfield {
 constexpr std::string_view kSeconds = "write a number of seconds";
 
 constexpr std::array kNumberFields = {
-    numberfield{&service::genpinginterval, meaning::kPause,
+    numberfield{&service::genpinginterval, numberkind::kPause,
                 "no pause at the end of a round and after a recovery", kSeconds},
-    numberfield{&service::funpinginterval, meaning::kPause, "no pause after a check", kSeconds},
-    numberfield{&service::maxattemptofwakeup, meaning::kAttempts,
+    numberfield{&service::funpinginterval, numberkind::kPause, "no pause after a check", kSeconds},
+    numberfield{&service::maxattemptofwakeup, numberkind::kAttempts,
                 "the service is never asked and given up at once", "write 2 or more"},
-    numberfield{&service::MaxFPSkips, meaning::kSkips,
+    numberfield{&service::MaxFPSkips, numberkind::kSkips,
                 "no check is left out, and the thresholds are not looked at",
                 "write a number of checks"},
-    numberfield{&service::ThresholdAverageCPUUsage, meaning::kThreshold,
+    numberfield{&service::ThresholdAverageCPUUsage, numberkind::kThreshold,
                 "the service counts as busy from its first tick on",
                 "write a number, 1000 for each per cent of a processor"},
-    numberfield{&service::ThresholdMemoryUsage, meaning::kThreshold,
+    numberfield{&service::ThresholdMemoryUsage, numberkind::kThreshold,
                 "the service always counts as busy", "write a number of pages"},
-    numberfield{&service::ThresholdThreadCount, meaning::kThreshold,
+    numberfield{&service::ThresholdThreadCount, numberkind::kThreshold,
                 "the service always counts as busy", "write a number of threads"},
-    numberfield{&service::ThresholdHandleCount, meaning::kNothing, "", ""},
+    numberfield{&service::ThresholdHandleCount, numberkind::kNothing, "", ""},
 };
 
 constexpr std::int64_t kSecondsInYear = 31556952;
@@ -80,24 +81,24 @@ written cut(std::string_view text)
 std::int64_t numberof(const serviceview& view, const numberfield& known)
 {
     const std::string& text = view.record->*known.which;
-    return known.kind == meaning::kPause || known.kind == meaning::kAttempts
+    return known.kind == numberkind::kPause || known.kind == numberkind::kAttempts
                ? settingnumber(text)
                : Utility::str2int(text);
 }
 
 // Whether the daemon does anything with it.
-bool counts(const service& record, const numberfield& known)
+bool isused(const service& record, const numberfield& known)
 {
     switch (known.kind) {
-    case meaning::kPause:
+    case numberkind::kPause:
         return known.which == &service::genpinginterval || ischecked(record);
-    case meaning::kAttempts:
+    case numberkind::kAttempts:
         return true;
-    case meaning::kSkips:
+    case numberkind::kSkips:
         return ischecked(record);
-    case meaning::kThreshold:
+    case numberkind::kThreshold:
         return looksatthresholds(record);
-    case meaning::kNothing:
+    case numberkind::kNothing:
         break;
     }
     return false;
@@ -114,7 +115,7 @@ public:
 
     void run()
     {
-        if (!counts(*view.record, known)) {
+        if (!isused(*view.record, known)) {
             checkunused();
             return;
         }
@@ -152,13 +153,13 @@ private:
 
     void checkrange()
     {
-        if (known.kind == meaning::kAttempts) {
+        if (known.kind == numberkind::kAttempts) {
             add("number-range", severity::warning,
                 ", which is so large a number that the service is never given up");
             return;
         }
         std::string becomes = std::to_string(number);
-        if (known.kind == meaning::kPause) {
+        if (known.kind == numberkind::kPause) {
             const unsigned pause = pauseseconds(number);
             becomes = "a pause of " + std::to_string(pause) + " seconds, " +
                       std::to_string(pause / kSecondsInYear) + " years";
@@ -170,19 +171,19 @@ private:
     void checkvalue()
     {
         switch (known.kind) {
-        case meaning::kPause:
+        case numberkind::kPause:
             checkpause();
             break;
-        case meaning::kAttempts:
+        case numberkind::kAttempts:
             checkattempts();
             break;
-        case meaning::kSkips:
+        case numberkind::kSkips:
             checkskips();
             break;
-        case meaning::kThreshold:
+        case numberkind::kThreshold:
             checkthreshold();
             break;
-        case meaning::kNothing:
+        case numberkind::kNothing:
             break;
         }
     }
@@ -253,10 +254,10 @@ private:
             return;
         }
         const auto perpercent = std::int64_t{10} * sysconf(_SC_CLK_TCK);
-        const double percent = static_cast<double>(number) / static_cast<double>(perpercent);
         add("threshold-unit", severity::warning,
-            ", which is " + shortnumber(percent) + " % of one processor; " +
-                std::to_string(number) + " % would be " + std::to_string(number * perpercent));
+            ", which is " + shortnumber(processorpercent(static_cast<double>(number))) +
+                " % of one processor; " + std::to_string(number) + " % would be " +
+                std::to_string(number * perpercent));
     }
 
     void checkmemory()

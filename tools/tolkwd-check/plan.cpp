@@ -4,10 +4,9 @@
 #include <iterator>
 #include <limits>
 
-#include <unistd.h>
-
 #include "ProcessStatistics_Linux.h"
 #include "fields.h"
+#include "units.h"
 
 namespace check {
 
@@ -17,10 +16,6 @@ constexpr long long kGreatest = std::numeric_limits<long long>::max();
 
 constexpr plannedtime kOneCheck{.checks = 1};
 constexpr plannedtime kOneRecovery{.recoveries = 1};
-
-// The processor's threshold counts thousandths of a clock tick per second.
-constexpr double kThousandths = 1000;
-constexpr double kPercent = 100;
 
 long long sum(long long one, long long other) noexcept
 {
@@ -90,17 +85,14 @@ std::optional<checkplan> checkof(const service& svc)
         return std::nullopt;
     }
     const long long skips = Utility::str2int(svc.MaxFPSkips);
-    const auto ticks = static_cast<double>(sysconf(_SC_CLK_TCK));
-    const auto page = static_cast<double>(sysconf(_SC_PAGESIZE));
     return checkplan{
         .command = functionalcommand(svc),
         .every = roundof(svc),
         .skips = skips,
         .busy = busynessof(svc, skips),
         .unnoticed = longestunnoticed(svc, skips),
-        .processorpercent =
-            Utility::str2int(svc.ThresholdAverageCPUUsage) * kPercent / (kThousandths * ticks),
-        .memorybytes = Utility::str2int(svc.ThresholdMemoryUsage) * page,
+        .processorpercent = processorpercent(Utility::str2int(svc.ThresholdAverageCPUUsage)),
+        .memorybytes = pagesinbytes(Utility::str2int(svc.ThresholdMemoryUsage)),
         .threads = Utility::str2int(svc.ThresholdThreadCount),
     };
 }

@@ -1,14 +1,11 @@
 #include "plan.h"
 
 #include <algorithm>
-#include <array>
-#include <cmath>
-#include <cstdio>
-#include <limits>
 #include <string_view>
 
 #include "printable.h"
 #include "terminal.h"
+#include "units.h"
 #include "wdmonitortarget.h"
 
 namespace check {
@@ -20,30 +17,9 @@ namespace {
 constexpr std::string_view kIndent = "            ";
 constexpr std::size_t kTimeWidth = kIndent.size() - 4;
 
-constexpr double kMebibyte = 1024.0 * 1024.0;
-
-std::string number(long long count)
-{
-    return count == std::numeric_limits<long long>::max() ? "endless" : std::to_string(count);
-}
-
 std::string inseconds(const plannedtime& time)
 {
-    return number(time.seconds) + " s";
-}
-
-std::string counted(long long count, std::string_view one, std::string_view many)
-{
-    return number(count).append(" ").append(count == 1 ? one : many);
-}
-
-// With one digit behind the point where there is need of it.
-std::string rounded(double value)
-{
-    std::array<char, 64> text{};
-    const bool whole = std::abs(value - std::round(value)) < 0.05;
-    const int length = std::snprintf(text.data(), text.size(), whole ? "%.0f" : "%.1f", value);
-    return {text.data(), static_cast<std::size_t>(length)};
+    return numberwords(time.seconds) + " s";
 }
 
 std::string each(const plannedtime& time)
@@ -104,7 +80,7 @@ void writenotasked(std::ostream& out, const targetplan& plan)
 std::string busywords(const checkplan& check)
 {
     return "more than " + rounded(check.processorpercent) + " % of a processor, " +
-           rounded(check.memorybytes / kMebibyte) + " MiB or " +
+           rounded(check.memorybytes / kBytesPerMebibyte) + " MiB or " +
            counted(check.threads, "thread", "threads");
 }
 
@@ -115,13 +91,13 @@ void writebusiness(timeline& lines, const checkplan& check)
     } else if (check.busy == busyness::always) {
         lines.more("A service that is busy is not checked, and with these thresholds every one");
         lines.more("that lives is busy: " + busywords(check) + ".");
-        lines.more(check.unnoticed
-                       ? "Up to " + number(check.skips) + " in a row are left out (MaxFPSkips), " +
-                             "so one is made every " + inseconds(*check.unnoticed) + "."
-                       : "So it is never checked (MaxFPSkips is negative).");
+        lines.more(check.unnoticed ? "Up to " + numberwords(check.skips) +
+                                         " in a row are left out (MaxFPSkips), " +
+                                         "so one is made every " + inseconds(*check.unnoticed) + "."
+                                   : "So it is never checked (MaxFPSkips is negative).");
     } else {
         lines.more(check.unnoticed
-                       ? "left out while the service is busy, at most " + number(check.skips) +
+                       ? "left out while the service is busy, at most " + numberwords(check.skips) +
                              " in a row; a failure then stays"
                        : "left out as long as the service is busy (MaxFPSkips is negative); "
                          "a failure then stays");
@@ -227,7 +203,8 @@ void writeagain(timeline& lines, const targetplan& plan, const outageplan& outag
     lines.at(*recovery.again, again);
     if (recovery.number == 1) {
         lines.more(std::string("if it ").append(words.works) + ", " +
-                   number(recovery.recovered->seconds - recovery.again->seconds) + " s later:");
+                   numberwords(recovery.recovered->seconds - recovery.again->seconds) +
+                   " s later:");
         lines.more(message("INFO", outage.log.recovered));
         lines.more("if not: from \"noticed\" on once more");
     }
@@ -242,9 +219,10 @@ void writerecoveries(timeline& lines, const targetplan& plan, const outageplan& 
             lines.more("... a recovery every " + inseconds(outage.round) + " ...");
         }
         before = recovery.number;
-        lines.at(recovery.begins, outage.unproven ? "a recovery begins"
-                                                  : "recovery " + number(recovery.number) + " of " +
-                                                        number(plan.attempts) + " begins");
+        lines.at(recovery.begins, outage.unproven
+                                      ? "a recovery begins"
+                                      : "recovery " + numberwords(recovery.number) + " of " +
+                                            numberwords(plan.attempts) + " begins");
         if (recovery.number == 1) {
             lines.more(message("ERROR", outage.log.begins));
         }
@@ -258,11 +236,11 @@ void writerecoveries(timeline& lines, const targetplan& plan, const outageplan& 
 
 void writerevival(timeline& lines, const targetplan& plan)
 {
-    lines.more("It is watched again after the next refresh, at most " + number(plan.refresh) +
+    lines.more("It is watched again after the next refresh, at most " + numberwords(plan.refresh) +
                " s later" + (plan.othersround ? "," : "."));
     if (plan.othersround) {
-        lines.more("and when the rounds of all others have ended: " + number(*plan.othersround) +
-                   " s more if they are well.");
+        lines.more("and when the rounds of all others have ended: " +
+                   numberwords(*plan.othersround) + " s more if they are well.");
     }
 }
 

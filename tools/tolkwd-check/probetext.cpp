@@ -9,6 +9,7 @@
 #include "fields.h"
 #include "printable.h"
 #include "terminal.h"
+#include "units.h"
 #include "wdmonitorthread_linux.h"
 
 namespace check {
@@ -16,8 +17,10 @@ namespace check {
 namespace {
 
 constexpr std::size_t kShownBytes = 160; // of an answer
-constexpr double kBytesPerMebibyte = 1048576;
-constexpr double kFigurePerTick = 1000;
+
+// Whoever has more of them than a screen holds looks into the file.
+constexpr int kShownChecks = 20;
+
 constexpr const char* kIndent = "             ";
 
 struct verdict {
@@ -54,18 +57,6 @@ verdict checkverdict(int result)
 std::string_view colourof(const verdict& verdict)
 {
     return verdict.good ? tools::kGreen : tools::kRed;
-}
-
-// With one digit behind the point, or none where that is 0.
-std::string rounded(double value)
-{
-    std::array<char, 64> text{};
-    (void)std::snprintf(text.data(), text.size(), "%.1f", value);
-    std::string number = text.data();
-    if (number.ends_with(".0")) {
-        number.resize(number.size() - 2);
-    }
-    return number;
 }
 
 std::string secondswords(double seconds)
@@ -110,13 +101,12 @@ std::string withunit(int value, std::string_view unit, const std::string& words)
 
 std::string memorywords(int pages)
 {
-    return rounded(pages * static_cast<double>(sysconf(_SC_PAGESIZE)) / kBytesPerMebibyte) + " MiB";
+    return rounded(pagesinbytes(pages) / kBytesPerMebibyte) + " MiB";
 }
 
 std::string processorwords(int figure)
 {
-    const auto ticks = static_cast<double>(sysconf(_SC_CLK_TCK));
-    return rounded(figure / kFigurePerTick / ticks * 100) + " %";
+    return rounded(processorpercent(figure)) + " %";
 }
 
 std::string nowords(int /*value*/)
@@ -172,22 +162,14 @@ std::string username()
     return entry != nullptr ? tools::printable(entry->pw_name) : "user " + std::to_string(user);
 }
 
-std::string counted(std::size_t count, const std::string& one)
-{
-    return std::to_string(count) + ' ' + one + (count == 1 ? "" : "s");
-}
-
 } // namespace
-
-// Whoever has more of them than a screen holds looks into the file.
-constexpr std::size_t kShownChecks = 20;
 
 std::optional<std::string> probequestion(const daemonview& view)
 {
     if (!view.loaded || view.targets.empty()) {
         return std::nullopt;
     }
-    std::size_t checks = 0;
+    int checks = 0;
     std::string commands;
     for (const targetview& target : view.targets) {
         if (ischecked(*target.monitored.record) && ++checks <= kShownChecks) {
@@ -198,11 +180,12 @@ std::optional<std::string> probequestion(const daemonview& view)
     if (checks > kShownChecks) {
         commands += "  and " + std::to_string(checks - kShownChecks) + " more\n";
     }
-    const std::size_t targets = view.targets.size();
+    const auto targets = static_cast<long long>(view.targets.size());
     return (checks > 0 ? "The checks:\n" : "") + commands + "This runs " +
-           counted(targets + checks, "command") + " as " + username() + " (" +
-           counted(targets, "status command") + ", " + counted(checks, "check") +
-           "), and pidof for " + counted(targets, "program") +
+           counted(targets + checks, "command", "commands") + " as " + username() + " (" +
+           counted(targets, "status command", "status commands") + ", " +
+           counted(checks, "check", "checks") + "), and pidof for " +
+           counted(targets, "program", "programs") +
            (geteuid() == 0 ? "" : "; the daemon runs them as root") + ". Go on? [y/N] ";
 }
 

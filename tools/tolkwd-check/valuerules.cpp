@@ -126,8 +126,10 @@ constexpr std::array<rule, 22> kRules{{
     {"threshold-zero", "a threshold of 0, which is always passed",
      "0 does not switch a threshold off. Threads and memory of a live process are above "
      "it, and so is its processor time with the first tick: the service counts as busy, "
-     "and its check is left out as often as MaxFPSkips allows. To leave a figure out, "
-     "write a number that it cannot reach.",
+     "and its check is left out as often as MaxFPSkips allows. A check left out counts "
+     "as a good one: behind a recovery it is reported as recovered, though nothing has "
+     "shown it, and the service is never given up. To leave a figure out, write a number "
+     "that it cannot reach.",
      "<ThresholdMemoryUsage>0</ThresholdMemoryUsage>",
      "<ThresholdMemoryUsage>2147483647</ThresholdMemoryUsage>"},
     {"unbounded-command", "a command without a time limit",
