@@ -7,41 +7,15 @@ import subprocess
 
 import pytest
 
+from configurations import configuration
+
 LIMIT_SECONDS = 60
 ESCAPE = "\x1b[31m"
 
-FIELDS = {
-    "name": "web",
-    "binarypath": "/usr/sbin/webd",
-    "startcmd": "timeout 60 service web start",
-    "stopcmd": "timeout 60 service web stop",
-    "functionalpingcmd": "NULL",
-    "genpinginterval": "60",
-    "funpinginterval": "60",
-    "maxattemptofwakeup": "3",
-    "messageformat": "x",
-    "hackmessagehandler": "x",
-    "sendmessagehandler": "x",
-    "MaxFPSkips": "0",
-    "ThresholdAverageCPUUsage": "90000",
-    "ThresholdMemoryUsage": "262144",
-    "ThresholdThreadCount": "200",
-    "ThresholdHandleCount": "100",
-}
-
-
-def configuration(before="", **fields):
-    """A file with one target, with these fields and what is to stand before it."""
-    lines = "".join(f"<{key}>{value}</{key}>\n" for key, value in {**FIELDS, **fields}.items())
-    return ("<?xml version='1.0'?>\n<wdtargets>\n" + before +
-            "<wdmonitortarget>\n<wdmonitorservice>\n" + lines +
-            "</wdmonitorservice>\n</wdmonitortarget>\n</wdtargets>\n")
-
-
-SOUND = configuration()
-NOTED = configuration(before="<!-- web -->\n")
-WARNED = configuration(before="<!-- für --><!-- web -->\n", maxattemptofwakeup="1")
-WRONG = configuration(before="<!-- web -->\n", maxattemptofwakeup="0")
+SOUND = configuration({})
+NOTED = configuration({}, before="<!-- web -->\n")
+WARNED = configuration({"maxattemptofwakeup": "1"}, before="<!-- für --><!-- web -->\n")
+WRONG = configuration({"maxattemptofwakeup": "0"}, before="<!-- web -->\n")
 
 
 @pytest.fixture(scope="session")

@@ -10,6 +10,8 @@ import time
 
 import pytest
 
+from configurations import configuration
+
 PROJECT = pathlib.Path(__file__).resolve().parents[2]
 LIMIT_SECONDS = 60
 
@@ -28,18 +30,6 @@ KEYS = {
     "binarypath": "/usr/sbin/no-such-program",
     "startcmd": "touch /opt/stage/started",
     "stopcmd": "touch /opt/stage/stopped",
-    "functionalpingcmd": "NULL",
-    "genpinginterval": "60",
-    "funpinginterval": "60",
-    "maxattemptofwakeup": "3",
-    "messageformat": "x",
-    "hackmessagehandler": "x",
-    "sendmessagehandler": "x",
-    "MaxFPSkips": "0",
-    "ThresholdAverageCPUUsage": "90000",
-    "ThresholdMemoryUsage": "262144",
-    "ThresholdThreadCount": "200",
-    "ThresholdHandleCount": "100",
 }
 
 
@@ -56,13 +46,8 @@ class Sandbox:
 
     def configure(self, *targets):
         """The file; a target is a dictionary of the keys that it sets, and its name."""
-        text = "<?xml version='1.0'?>\n<wdtargets>\n"
-        for target in targets:
-            text += "<wdmonitortarget>\n<wdmonitorservice>\n"
-            for key, value in {**KEYS, **target}.items():
-                text += f"<{key}>{value}</{key}>\n"
-            text += "</wdmonitorservice>\n</wdmonitortarget>\n"
-        (self.stage / "tolkwd.xml").write_text(text + "</wdtargets>\n")
+        (self.stage / "tolkwd.xml").write_text(
+            configuration(*({**KEYS, **target} for target in targets)))
 
     def command(self, shell):
         """The command line that runs these lines of shell in the sandbox."""

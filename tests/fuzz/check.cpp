@@ -17,6 +17,7 @@
 #include "daemonview.h"
 #include "finding.h"
 #include "fuzz.h"
+#include "handlerstate.h"
 #include "json.h"
 #include "load.h"
 #include "machine.h"
@@ -203,16 +204,6 @@ bool sametarget(const json& told, const wdmonitortarget& target)
     return samerecord(told.at("monitored"), target.monitoredservice) &&
            std::equal(told.at("dependents").begin(), told.at("dependents").end(),
                       target.dependentservices.begin(), target.dependentservices.end(), samerecord);
-}
-
-void resethandler()
-{
-    xercecstack = {};
-    charparse.clear();
-    monitorservice = {};
-    monservicedep = {};
-    monservicedepends.clear();
-    target = {};
 }
 
 // False where the daemon cannot load the file. Its records are in xmlparser::alltargets.

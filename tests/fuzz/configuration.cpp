@@ -12,6 +12,7 @@
 #include <string_view>
 
 #include "fuzz.h"
+#include "handlerstate.h"
 #include "memoryfile.h"
 #include "tokenizer_model.h"
 #include "wdxmlparserhandler.h"
@@ -143,18 +144,6 @@ private:
     std::vector<Record> dependents;
     std::vector<Target> targets;
 };
-
-void resethandler()
-{
-    xercecstack = {};
-    charparse.clear();
-    monitorservice = {};
-    monservicedep = {};
-    monservicedepends.clear();
-    target = {};
-    xmlparser::alltargets.clear();
-    xmlparser::allservices.clear();
-}
 
 // False where a tag without a name ended it.
 bool load(const std::string& path, Stopwatch& watch)
