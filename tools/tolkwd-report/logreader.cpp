@@ -1,1 +1,641 @@
 #include "logreader.h"
+
+#include <algorithm>
+#include <array>
+#include <cstring>
+#include <limits>
+#include <optional>
+#include <utility>
+
+#include "logclock.h"
+#include "recogniser.h"
+
+namespace report {
+
+namespace {
+
+constexpr std::size_t kLongestLineBytes = 1 << 20; // what is longer is no line
+constexpr std::size_t kMostHeldBytes = 1 << 16;    // of lines that follow a message
+constexpr std::size_t kMostHeldLines = 1000;
+constexpr std::size_t kLongestPrefixBytes = 512; // of the journal's, with its host name
+
+constexpr std::string_view kThreadMark = "|TID";
+constexpr std::string_view kPrefixEnd = "]: ";
+
+constexpr std::string_view kExportBegins = "__CURSOR=";
+constexpr std::string_view kExportMessage = "MESSAGE";
+constexpr std::size_t kExportLengthBytes = 8;
+constexpr std::size_t kLongestFieldNameBytes = 64;
+
+constexpr bool isdigit(char byte) noexcept
+{
+    return byte >= '0' && byte <= '9';
+}
+
+// What stands before a message in its line.
+struct linehead {
+    std::int64_t clock = 0;
+    speakerid who = recogniser::kNobody;
+    std::uint64_t thread = 0;
+    std::size_t bytes = 0; // its length
+};
+
+// Who wrote a line, by the journal: the "tolkwd[123]: " that its prefix ends in.
+std::string_view writerin(std::string_view prefix)
+{
+    return prefix.substr(prefix.substr(0, prefix.size() - 1).find_last_of(' ') + 1);
+}
+
+// The length of the journal's prefix of a line that does not tell itself where it begins; 0 where
+// there is none.
+std::size_t prefixbytes(std::string_view line)
+{
+    const std::size_t end = line.substr(0, kLongestPrefixBytes).find(kPrefixEnd);
+    const bool isprefix = end != std::string_view::npos && end > 0 && isdigit(line[end - 1]);
+    return isprefix ? end + kPrefixEnd.size() : 0;
+}
+
+bool isfieldname(std::string_view name)
+{
+    return !name.empty() && name.size() <= kLongestFieldNameBytes &&
+           std::all_of(name.begin(), name.end(), [](char byte) {
+               return (byte >= 'A' && byte <= 'Z') || isdigit(byte) || byte == '_';
+           });
+}
+
+// A message that lines behind it may belong to.
+struct heldmessage {
+    message said{}; // without its texts
+    speakerid who = recogniser::kNobody;
+    std::int64_t clock = 0;
+    std::string text{};
+    std::string more{};
+    std::size_t lines = 0; // behind its first one
+};
+
+} // namespace
+
+class logreader::work {
+public:
+    work(wanted which, listener hear) : everything(which == wanted::kAll), told(std::move(hear)) {}
+
+    void feed(std::string_view bytes);
+    void pause();
+    void endfile();
+
+    readcount count;
+    logclock clock;
+
+private:
+    // What the next bytes are.
+    enum class part : std::uint8_t {
+        kLine,
+        kFieldLength, // of a field of the export format that may hold anything
+        kField,
+        kFieldEnd, // its newline
+    };
+
+    // What the lines behind a message are.
+    enum class following : std::uint8_t {
+        kStrange, // somebody else's
+        kGoesOn,  // they belong to it
+        kUnwhole, // the message is not whole without them
+    };
+
+    const bool everything;
+    const listener told;
+    const recogniser& known = recogniser::ofall();
+    const speakerid standarderror = known.speakerof(loglevel::kStandardError, {});
+
+    part at = part::kLine;
+    std::string partial;       // of a line, or of a field, whose end has not come yet
+    bool overlong = false;     // what has come of it is not kept
+    bool isfirst = true;       // line of its file
+    bool exported = false;     // this file has the export format
+    bool ismessage = false;    // this field is one
+    std::uint64_t missing = 0; // bytes of the field
+    std::uint64_t line = 0;    // the number of the one at hand
+
+    following behind = following::kStrange;
+    std::string writer;   // of the message that they follow
+    bool hastime = false; // a message had
+    bool isheld = false;  // `held` holds a message
+    heldmessage held;
+
+    std::string_view takeline(std::string_view bytes);
+    std::string_view takelength(std::string_view bytes);
+    std::string_view takefield(std::string_view bytes);
+    void keep(std::string_view piece);
+    void endline(std::string_view text);
+    void endfield();
+    void endpartial();
+
+    void readline(std::string_view text);
+    void readexported(std::string_view text);
+    void readentry(std::string_view text);
+    void readlogged(std::string_view text, std::string_view from);
+    void readunlogged(std::string_view text);
+    void follow(std::string_view text);
+
+    bool readhead(std::string_view text, linehead& head);
+    std::size_t findhead(std::string_view text);
+    bool istorn(const recogniser::found& found, std::string_view text);
+    void take(const linehead& head, const recogniser::found& found, std::string_view text,
+              std::string_view from);
+    void holdunwhole(const linehead& head, std::string_view text, std::string_view from);
+    void complete();
+    void settle();
+    void dropunwhole();
+    void tellheld();
+    instant moment(std::int64_t when);
+    void tell(message& said) { told(said); }
+};
+
+// ---- From bytes to lines.
+
+void logreader::work::feed(std::string_view bytes)
+{
+    count.bytes += bytes.size();
+    while (!bytes.empty()) {
+        switch (at) {
+        case part::kLine:
+            bytes = takeline(bytes);
+            break;
+        case part::kFieldLength:
+            bytes = takelength(bytes);
+            break;
+        case part::kField:
+            bytes = takefield(bytes);
+            break;
+        case part::kFieldEnd:
+            if (bytes.front() == '\n') {
+                bytes.remove_prefix(1);
+                ++count.lines;
+            }
+            at = part::kLine;
+            break;
+        }
+    }
+}
+
+// Returns what stands behind the line.
+std::string_view logreader::work::takeline(std::string_view bytes)
+{
+    const std::size_t end = bytes.find('\n');
+    if (end == std::string_view::npos) {
+        keep(bytes);
+        return {};
+    }
+    const std::string_view piece = bytes.substr(0, end);
+    if (partial.empty() && !overlong) {
+        endline(piece);
+    } else {
+        keep(piece);
+        endpartial();
+    }
+    return bytes.substr(end + 1);
+}
+
+void logreader::work::keep(std::string_view piece)
+{
+    if (overlong || piece.size() > kLongestLineBytes - partial.size()) {
+        overlong = true;
+        partial.clear();
+    } else {
+        partial.append(piece);
+    }
+}
+
+void logreader::work::endpartial()
+{
+    if (std::exchange(overlong, false)) {
+        ++count.lines;
+        ++count.torn;
+        isfirst = false;
+        return;
+    }
+    const std::string text = std::exchange(partial, {});
+    endline(text);
+}
+
+void logreader::work::endline(std::string_view text)
+{
+    line = ++count.lines;
+    if (text.size() > kLongestLineBytes) {
+        ++count.torn;
+    } else {
+        readline(text);
+    }
+    isfirst = false;
+}
+
+std::string_view logreader::work::takelength(std::string_view bytes)
+{
+    const std::string_view piece = bytes.substr(0, kExportLengthBytes - partial.size());
+    partial.append(piece);
+    if (partial.size() == kExportLengthBytes) {
+        missing = 0;
+        for (std::size_t i = kExportLengthBytes; i > 0; --i) {
+            missing = missing << 8U | static_cast<unsigned char>(partial[i - 1]);
+        }
+        partial.clear();
+        at = missing > 0 ? part::kField : part::kFieldEnd;
+    }
+    return bytes.substr(piece.size());
+}
+
+std::string_view logreader::work::takefield(std::string_view bytes)
+{
+    const std::string_view piece =
+        bytes.substr(0, static_cast<std::size_t>(std::min<std::uint64_t>(missing, bytes.size())));
+    missing -= piece.size();
+    count.lines += static_cast<std::uint64_t>(std::count(piece.begin(), piece.end(), '\n'));
+    if (ismessage) {
+        keep(piece);
+    }
+    if (missing == 0) {
+        endfield();
+        at = part::kFieldEnd;
+    }
+    return bytes.substr(piece.size());
+}
+
+void logreader::work::endfield()
+{
+    if (std::exchange(overlong, false)) {
+        ++count.torn;
+    }
+    const std::string text = std::exchange(partial, {});
+    if (!std::exchange(ismessage, false)) {
+        return;
+    }
+    for (std::string_view rest = text; !rest.empty();) {
+        const std::string_view entry = rest.substr(0, rest.find('\n'));
+        readentry(entry);
+        rest.remove_prefix(std::min(entry.size() + 1, rest.size()));
+    }
+}
+
+void logreader::work::readline(std::string_view text)
+{
+    if (text.ends_with('\r')) {
+        text.remove_suffix(1);
+    }
+    exported = exported || (isfirst && text.starts_with(kExportBegins));
+    if (exported) {
+        readexported(text);
+    } else {
+        readentry(text);
+    }
+}
+
+// A line of the export format: a field, or the name of one that may hold anything, or the empty
+// line between two entries.
+void logreader::work::readexported(std::string_view text)
+{
+    const std::size_t sign = text.find('=');
+    const std::string_view name = text.substr(0, sign);
+    if (text.empty()) {
+        return;
+    }
+    if (!isfieldname(name)) {
+        ++count.foreign;
+    } else if (sign == std::string_view::npos) {
+        ismessage = name == kExportMessage;
+        at = part::kFieldLength;
+    } else if (name == kExportMessage) {
+        readentry(text.substr(sign + 1));
+    }
+}
+
+// ---- From lines to messages.
+
+// A line as somebody wrote it, or as the journal prints it.
+void logreader::work::readentry(std::string_view text)
+{
+    linehead head;
+    if (readhead(text, head)) {
+        readlogged(text, {});
+        return;
+    }
+    const std::string_view prefixes = text.substr(0, kLongestPrefixBytes);
+    for (std::size_t end = prefixes.find(kPrefixEnd); end != std::string_view::npos;
+         end = prefixes.find(kPrefixEnd, end + 1)) {
+        const std::size_t begin = end + kPrefixEnd.size();
+        if (readhead(text.substr(begin), head)) {
+            readlogged(text.substr(begin), writerin(text.substr(0, begin)));
+            return;
+        }
+    }
+    readunlogged(text);
+}
+
+// A text that begins with a head, and may hold others where writing was cut off before them.
+void logreader::work::readlogged(std::string_view text, std::string_view from)
+{
+    for (;;) {
+        settle();
+        linehead head;
+        readhead(text, head);
+        const std::string_view said = text.substr(head.bytes);
+        const recogniser::found found = known.find(head.who, said);
+        const std::size_t next =
+            found.form == nullptr || istorn(found, said) ? findhead(said) : std::string_view::npos;
+        if (next == std::string_view::npos) {
+            take(head, found, said, from);
+            return;
+        }
+        ++count.torn;
+        text = said.substr(next);
+    }
+}
+
+// What no head begins.
+void logreader::work::readunlogged(std::string_view text)
+{
+    const std::size_t prefix = prefixbytes(text);
+    const std::string_view from = prefix > 0 ? writerin(text.substr(0, prefix)) : "";
+    const std::string_view said = text.substr(prefix);
+    const recogniser::found found = known.find(standarderror, said);
+    if (found.form != nullptr) {
+        settle();
+        take({.who = standarderror}, found, said, from);
+        return;
+    }
+    const std::size_t next = findhead(text);
+    if (next != std::string_view::npos) {
+        ++count.torn;
+        readlogged(text.substr(next), {});
+        return;
+    }
+    if (behind != following::kStrange && from == writer) {
+        follow(said);
+    } else if (isfirst &&
+               (text.find(kThreadMark) != std::string_view::npos || known.endsmessage(text))) {
+        ++count.torn;
+    } else {
+        ++count.foreign;
+    }
+}
+
+// A line that belongs to the message before.
+void logreader::work::follow(std::string_view text)
+{
+    if (!isheld) {
+        return; // of a message that is counted only, or has been told
+    }
+    std::string& into = behind == following::kUnwhole ? held.text : held.more;
+    const bool room = into.size() + text.size() < kMostHeldBytes && held.lines < kMostHeldLines;
+    if (behind == following::kUnwhole) {
+        ++held.lines;
+        if (!room) {
+            dropunwhole();
+            return;
+        }
+        into.append("\n").append(text);
+        complete();
+    } else if (room) {
+        ++held.lines;
+        into.append(text).append("\n");
+    }
+}
+
+bool logreader::work::readhead(std::string_view text, linehead& head)
+{
+    if (text.size() <= logclock::kDateBytes) {
+        return false;
+    }
+    const std::string_view rest = text.substr(logclock::kDateBytes);
+    const auto& speakers = known.speakers();
+    const auto who = std::find_if(speakers.begin(), speakers.end(), [&](const speaker& voice) {
+        return voice.level != loglevel::kStandardError && rest.starts_with(voice.head);
+    });
+    if (who == speakers.end()) {
+        return false;
+    }
+    std::size_t place = who->head.size();
+    const std::size_t digits = place;
+    std::uint64_t thread = 0;
+    for (; place < rest.size() && isdigit(rest[place]); ++place) {
+        const auto digit = static_cast<std::uint64_t>(rest[place] - '0');
+        constexpr std::uint64_t kMost = std::numeric_limits<std::uint64_t>::max();
+        if (thread > (kMost - digit) / 10) {
+            return false;
+        }
+        thread = thread * 10 + digit;
+    }
+    if (place == digits || place == rest.size() || rest[place] != ' ') {
+        return false;
+    }
+    const auto clocktime = clock.read(text.data());
+    if (!clocktime) {
+        return false;
+    }
+    head = {*clocktime, static_cast<speakerid>(who - speakers.begin()), thread,
+            logclock::kDateBytes + place + 1};
+    return true;
+}
+
+// Where in `text` the first head begins.
+std::size_t logreader::work::findhead(std::string_view text)
+{
+    for (std::size_t mark = text.find(kThreadMark); mark != std::string_view::npos;
+         mark = text.find(kThreadMark, mark + 1)) {
+        const std::size_t end = mark + kThreadMark.size();
+        for (const speaker& voice : known.speakers()) {
+            const std::size_t before = logclock::kDateBytes + voice.head.size();
+            linehead head;
+            if (end >= before && text.substr(0, end).ends_with(voice.head) &&
+                readhead(text.substr(end - before), head)) {
+                return end - before;
+            }
+        }
+    }
+    return std::string_view::npos;
+}
+
+// Whether a message only seems to be one: a text of the configuration in it holds another's head.
+// What commands have printed may hold anything.
+bool logreader::work::istorn(const recogniser::found& found, std::string_view text)
+{
+    if (text.find(kThreadMark) == std::string_view::npos) {
+        return false;
+    }
+    const auto& configured = found.form->isconfigured;
+    return (configured[0] && findhead(found.what.first) != std::string_view::npos) ||
+           (configured[1] && findhead(found.what.second) != std::string_view::npos);
+}
+
+void logreader::work::take(const linehead& head, const recogniser::found& found,
+                           std::string_view text, std::string_view from)
+{
+    behind = following::kStrange;
+    if (found.form == nullptr) {
+        switch (known.fragmentof(head.who, text)) {
+        case fragment::kNone:
+            ++count.foreign;
+            break;
+        case fragment::kCut:
+            ++count.torn;
+            break;
+        case fragment::kMayFollow:
+            holdunwhole(head, text, from);
+            break;
+        }
+        return;
+    }
+    ++count.messages;
+    message said{.id = found.what.id,
+                 .level = known.speakers()[head.who].level,
+                 .thread = head.thread,
+                 .when = head.who == standarderror ? count.last : moment(head.clock),
+                 .first = found.what.first,
+                 .second = found.what.second,
+                 .text = text,
+                 .line = line};
+    if (found.form->goeson) {
+        behind = following::kGoesOn;
+        writer.assign(from);
+    }
+    if (!everything && !matters(said.id)) {
+        return;
+    }
+    if (!found.form->goeson) {
+        tell(said);
+        return;
+    }
+    isheld = true;
+    held = {.said = said, .who = head.who, .clock = head.clock, .text = std::string(text)};
+}
+
+void logreader::work::holdunwhole(const linehead& head, std::string_view text,
+                                  std::string_view from)
+{
+    behind = following::kUnwhole;
+    writer.assign(from);
+    isheld = true;
+    held = {.who = head.who, .clock = head.clock, .text = std::string(text)};
+    held.said.thread = head.thread;
+    held.said.level = known.speakers()[head.who].level;
+    held.said.line = line;
+}
+
+// The message that was not whole may be now.
+void logreader::work::complete()
+{
+    const recogniser::found found = known.find(held.who, held.text);
+    if (found.form == nullptr) {
+        return;
+    }
+    ++count.messages;
+    held.said.id = found.what.id;
+    held.said.when = moment(held.clock);
+    behind = found.form->goeson ? following::kGoesOn : following::kStrange;
+    isheld = everything || matters(found.what.id);
+    if (isheld && behind == following::kStrange) {
+        tellheld();
+    }
+}
+
+// Another message begins: nothing more follows the one before.
+void logreader::work::settle()
+{
+    if (!isheld) {
+        return;
+    }
+    if (behind == following::kUnwhole) {
+        dropunwhole();
+    } else {
+        tellheld();
+    }
+}
+
+// The beginning of a message whose end has not come, and the lines behind it.
+void logreader::work::dropunwhole()
+{
+    ++count.torn;
+    count.foreign += held.lines;
+    isheld = false;
+    behind = following::kStrange;
+}
+
+void logreader::work::tellheld()
+{
+    const recogniser::found found = known.find(held.who, held.text);
+    held.said.first = found.what.first;
+    held.said.second = found.what.second;
+    held.said.text = held.text;
+    held.said.more = held.more;
+    isheld = false;
+    tell(held.said);
+}
+
+instant logreader::work::moment(std::int64_t when)
+{
+    const instant now = clock.advance(when);
+    if (!hastime) {
+        hastime = true;
+        count.first = now;
+    }
+    count.last = now;
+    count.clockchanges = clock.changes();
+    return now;
+}
+
+void logreader::work::pause()
+{
+    if (isheld && behind == following::kGoesOn) {
+        tellheld();
+    }
+}
+
+void logreader::work::endfile()
+{
+    if (at == part::kLine && !partial.empty()) {
+        endpartial();
+    } else if (overlong || at == part::kFieldLength || at == part::kField) {
+        ++count.torn;
+    }
+    settle();
+    at = part::kLine;
+    partial.clear();
+    overlong = false;
+    ismessage = false;
+    exported = false;
+    isfirst = true;
+    behind = following::kStrange;
+}
+
+logreader::logreader(wanted which, listener hear)
+    : self(std::make_unique<work>(which, std::move(hear)))
+{
+}
+
+logreader::~logreader() = default;
+
+void logreader::feed(std::string_view bytes)
+{
+    self->feed(bytes);
+}
+
+void logreader::pause()
+{
+    self->pause();
+}
+
+void logreader::endfile()
+{
+    self->endfile();
+}
+
+const readcount& logreader::count() const noexcept
+{
+    return self->count;
+}
+
+instant logreader::at(std::time_t utc) const
+{
+    return self->clock.at(utc);
+}
+
+} // namespace report

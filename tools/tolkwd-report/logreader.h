@@ -6,6 +6,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <ctime>
 #include <functional>
 #include <memory>
 #include <string>
@@ -18,7 +19,7 @@ namespace report {
 // What was read.
 struct readcount {
     std::uint64_t bytes = 0;
-    std::uint64_t lines = 0;    // all
+    std::uint64_t lines = 0;    // all, as an editor numbers them
     std::uint64_t messages = 0; // of the daemon's
     std::uint64_t foreign = 0;  // lines of others; those that go on with a message are not counted
     std::uint64_t torn = 0;     // beginnings and ends of lines that are not whole
@@ -30,7 +31,7 @@ struct readcount {
 // How much of what it reads a listener wants to hear.
 enum class wanted : std::uint8_t {
     kAll,         // each message
-    kWhatMatters, // what may change a state; steps that tell nothing are counted only
+    kWhatMatters, // what matters(); all else is counted only
 };
 
 class logreader {
@@ -55,6 +56,10 @@ public:
     void endfile();
 
     [[nodiscard]] const readcount& count() const noexcept;
+
+    // A moment of the machine's clock, `utc` seconds since 1970, on the log's two clocks; not
+    // before the last message.
+    [[nodiscard]] instant at(std::time_t utc) const;
 
 private:
     class work;

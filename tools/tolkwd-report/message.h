@@ -85,6 +85,49 @@ enum class messageid : std::uint8_t {
     kForeign, // no message of the daemon's
 };
 
+// Whether such a message may change what is known of a service's state, or of whether anything is
+// watched. All others are steps on the way, figures and the listing. Any thread.
+constexpr bool matters(messageid id) noexcept
+{
+    switch (id) {
+    case messageid::kThreadEntered:
+    case messageid::kThreadCreated:
+    case messageid::kBeforeJoin:
+    case messageid::kAfterJoin:
+    case messageid::kListing:
+    case messageid::kPingBegins:
+    case messageid::kPingAsks:
+    case messageid::kNoStatusFile:
+    case messageid::kStatusAnswered:
+    case messageid::kPingFailed:
+    case messageid::kPingUnknown:
+    case messageid::kPingUnclear:
+    case messageid::kRetriesLeft:
+    case messageid::kPingRetry:
+    case messageid::kGeneralPause:
+    case messageid::kRecoveryWaits:
+    case messageid::kRecoveryBegins:
+    case messageid::kRecoveryStep:
+    case messageid::kNotConfigured:
+    case messageid::kRecoveryEnds:
+    case messageid::kNoCheck:
+    case messageid::kCheckAsks:
+    case messageid::kNoCheckFile:
+    case messageid::kCheckException:
+    case messageid::kCheckNotFound:
+    case messageid::kCheckUnclear:
+    case messageid::kCheckRetry:
+    case messageid::kFunctionalPause:
+    case messageid::kCannotSkip:
+    case messageid::kNoFigures:
+    case messageid::kFigures:
+    case messageid::kForeign:
+        return false;
+    default:
+        return true;
+    }
+}
+
 enum class loglevel : std::uint8_t { kError, kInfo, kDebug, kStandardError };
 
 // One form of a message. Values stand in it as {NAME}; `module` has the blank that two of the
@@ -104,8 +147,8 @@ std::span<const messageform> messageforms() noexcept;
 // was given.
 struct recognised {
     messageid id = messageid::kForeign;
-    std::string_view first;  // the first value, a {NAME} or {PATH} mostly; empty without values
-    std::string_view second; // the second one
+    std::string_view first{};  // the first value, a {NAME} or {PATH} mostly; empty without values
+    std::string_view second{}; // the second one
 };
 
 // Which message `text` is, under `level` and `module`. A value may hold anything, also the words of
@@ -118,11 +161,11 @@ struct message {
     loglevel level = loglevel::kInfo;
     std::uint64_t thread = 0; // 0: standard error has none
     instant when;             // of standard error: the line's before
-    std::string_view first;   // values, see recognised
-    std::string_view second;
-    std::string_view text;  // the whole message
-    std::string_view more;  // the lines that follow it and belong to it, with their newlines
-    std::uint64_t line = 0; // where it stands, counted from 1 over all files
+    std::string_view first{}; // values, see recognised
+    std::string_view second{};
+    std::string_view text{}; // the whole message
+    std::string_view more{}; // the lines that follow it and belong to it, with their newlines
+    std::uint64_t line = 0;  // where it stands, counted from 1 over all files
 };
 
 } // namespace report
