@@ -65,7 +65,7 @@ struct account {
 enum class eventkind : std::uint8_t {
     kWatched,   // a thread watches the service from now on
     kUnwatched, // no longer
-    kState,     // by inference only: no message of its own
+    kState,     // a state begins, by inference or by a step that only debug lines tell
     kFailed,    // a ping or check failed and will be retried
     kRecoveryTried,
     kRecovered,
@@ -82,12 +82,30 @@ enum class eventkind : std::uint8_t {
 // As users write it behind --kind: "recovery-tried".
 std::string_view wordof(eventkind kind) noexcept;
 
+// What something was inferred from.
+enum class inference : std::uint8_t {
+    kNone,          // not inferred
+    kAnnounced,     // a service is taken to be up until the first word about it
+    kRetryHelped,   // nothing came of a failure: a retry has succeeded
+    kCheckHelped,   // no failure followed a check: it has succeeded
+    kLeftOut,       // the others were announced anew, this service was not
+    kNothingLoaded, // there was no configuration in force
+    kDaemonEnded,   // the daemon ended, or had been silent for long when it was started anew
+    kWatchedAnew,   // announcements begin anew: a refresh or a new start
+    kStartedAnew,   // they do without a refresh
+    kClockChanged,  // the log's clock went back, or by an hour forth
+};
+
+// In plain words, as half a sentence: "taken to be up until the first word about it". Any thread.
+std::string_view wordsof(inference why) noexcept;
+
 struct event {
     eventkind kind = eventkind::kStep;
     instant when;
     std::optional<serviceid> service; // none: about the daemon, or a thread that is not known
     std::optional<state> became;      // the state that it began
     bool inferred = false;
+    inference why = inference::kNone;
     const message* source = nullptr; // none: inferred. Lives until the witness returns
 };
 
@@ -96,8 +114,8 @@ struct witness {
     // In the order of the log, but that an inferred one comes when it is known and is dated when it
     // happened.
     std::function<void(const event&)> happened;
-    // A span that has come to its end. Those of one service come in order, touch each other, and
-    // are never empty.
+    // A span that has come to its end, once it is sure that it has. Those of one service come in
+    // order, touch each other, and are never empty.
     std::function<void(serviceid, const span&)> ended;
 };
 
