@@ -1,0 +1,416 @@
+#include "status.h"
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+#include <string>
+#include <string_view>
+#include <tuple>
+#include <vector>
+
+#include <fmt/format.h>
+
+#include "columns.h"
+#include "servicestate.h"
+#include "terminal.h"
+#include "wdmonitorthread_linux.h"
+
+namespace report {
+
+namespace {
+
+constexpr std::int64_t kHourSeconds = 3600;
+constexpr std::int64_t kDaySeconds = 24 * kHourSeconds;
+
+// A failure about which nothing more has been said for so long is most likely over.
+constexpr std::int64_t kSilenceSeconds =
+    kFirstRetryPauseSeconds + kRetries * kGeneralRetryPauseSeconds + kPatienceSeconds;
+
+constexpr std::size_t kLeastNameColumns = 8;
+
+// How a state is shown: never by its colour alone.
+struct look {
+    char mark;
+    std::string_view colour;
+    std::string_view shortword; // where its word would take the room of a service's name
+};
+
+look lookof(state which)
+{
+    switch (which) {
+    case state::kUp:
+        return {'+', tools::kGreen, "up"};
+    case state::kBusy:
+        return {'*', tools::kCyan, "busy"};
+    case state::kNotWatched:
+        return {'-', tools::kFaint, "not-watched"};
+    case state::kCommandNotRecognised:
+        return {'?', tools::kYellow, "cmd-not-found"};
+    case state::kSuspect:
+        return {'!', tools::kYellow, "suspect"};
+    case state::kFunctionalFailure:
+        return {'!', tools::kYellow, "func-failure"};
+    case state::kRecovering:
+        return {'!', tools::kMagenta, "recovering"};
+    case state::kFunctionalRecovering:
+        return {'!', tools::kMagenta, "func-recovery"};
+    case state::kUnknownService:
+        return {'X', tools::kRed, "unknown"};
+    case state::kGaveUp:
+        return {'X', tools::kRed, "gave-up"};
+    }
+    return {' ', tools::kPlain, ""};
+}
+
+// How much room a table takes: the first of these that fits is taken, the last one with its names
+// cut.
+struct room {
+    bool fulltimes;
+    bool fullwords;
+};
+constexpr std::array<room, 3> kRooms{{{true, true}, {false, true}, {false, false}}};
+
+// "15:39" within a day before `end`, "Nov 21" within most of a year, else "Nov'25". Threads' lines,
+// and the hour that comes twice, may make a time seem later than the end.
+std::string shorttime(const instant& when, const instant& end)
+{
+    constexpr std::int64_t kNearDays = 300;
+    const std::int64_t age = end.clock - when.clock;
+    const std::string text = clocktext(when); // "2026-11-21 15:39:37"
+    if (age >= -kHourSeconds && age < kDaySeconds) {
+        return text.substr(11, 5);
+    }
+    constexpr std::array<std::string_view, 12> kMonths{"Jan", "Feb", "Mar", "Apr", "May", "Jun",
+                                                       "Jul", "Aug", "Sep", "Oct", "Nov", "Dec"};
+    const auto month = static_cast<std::size_t>(std::stoi(text.substr(5, 2)) - 1);
+    const bool near = age >= 0 && age < kNearDays * kDaySeconds;
+    return fmt::format("{}{}{}", kMonths.at(month), near ? ' ' : '\'',
+                       near ? text.substr(8, 2) : text.substr(2, 2));
+}
+
+// The same as spantext, in 6 columns: "45s", "3m30s", "2h05m", "3d04h".
+std::string shortspan(std::int64_t seconds)
+{
+    constexpr std::int64_t kMinuteSeconds = 60;
+    if (seconds < kMinuteSeconds) {
+        return fmt::format("{}s", seconds);
+    }
+    if (seconds < kHourSeconds) {
+        return fmt::format("{}m{:02}s", seconds / kMinuteSeconds, seconds % kMinuteSeconds);
+    }
+    if (seconds < kDaySeconds) {
+        return fmt::format("{}h{:02}m", seconds / kHourSeconds,
+                           seconds % kHourSeconds / kMinuteSeconds);
+    }
+    constexpr std::int64_t kManyDays = 100;
+    if (seconds < kManyDays * kDaySeconds) {
+        return fmt::format("{}d{:02}h", seconds / kDaySeconds,
+                           seconds % kDaySeconds / kHourSeconds);
+    }
+    return fmt::format("{}d", seconds / kDaySeconds);
+}
+
+// In 4 columns: "9999", "123k", "12M". Rounded down.
+std::string shortcount(std::uint64_t count)
+{
+    constexpr std::uint64_t kThousand = 1000;
+    constexpr std::uint64_t kMillion = kThousand * kThousand;
+    if (count < 10 * kThousand) {
+        return std::to_string(count);
+    }
+    return count < kMillion ? fmt::format("{}k", count / kThousand)
+                            : fmt::format("{}M", count / kMillion);
+}
+
+// Rounded down, so that only what was never out has 100 %.
+std::string sharetext(const std::optional<double>& share)
+{
+    if (!share) {
+        return "-";
+    }
+    constexpr double kSteps = 10000;
+    return *share >= 1 ? "100%" : fmt::format("{:.2f}%", std::floor(*share * kSteps) / 100);
+}
+
+// One column of the table.
+struct column {
+    std::string_view header;
+    bool right = false; // for numbers
+    std::vector<std::string> cells{};
+
+    [[nodiscard]] std::size_t width() const
+    {
+        std::size_t most = columnsof(header);
+        for (const std::string& cell : cells) {
+            most = std::max(most, columnsof(cell));
+        }
+        return most;
+    }
+};
+
+// In the order in which the lines have them.
+enum place : std::size_t { kName, kState, kSince, kLast, kOutages, kRecoveries, kSkips, kShare };
+
+using rows = std::vector<const account*>;
+
+rows sorted(const std::vector<account>& services)
+{
+    rows result;
+    result.reserve(services.size());
+    for (const account& each : services) {
+        result.push_back(&each);
+    }
+    std::stable_sort(result.begin(), result.end(), [](const account* one, const account* other) {
+        return std::tie(other->now.what, one->name) < std::tie(one->now.what, other->name);
+    });
+    return result;
+}
+
+class table {
+public:
+    table(const overview& all, const rows& lines, room taken) : seen(all), how(taken)
+    {
+        if (how.fulltimes) {
+            columns[kRecoveries].header = "RECOVERED";
+            columns[kSkips].header = "SKIPPED";
+            columns[kShare].header = "AVAILABLE";
+        }
+        for (const account* each : lines) {
+            add(*each);
+        }
+    }
+
+    // What its lines take, but for the names.
+    [[nodiscard]] std::size_t widthwithoutnames() const
+    {
+        std::size_t sum = kMarkColumns;
+        for (std::size_t i = kState; i < columns.size(); ++i) {
+            sum += columns.at(i).width() + gapbefore(i).size();
+        }
+        return sum;
+    }
+
+    [[nodiscard]] std::size_t namewidth() const { return columns[kName].width(); }
+
+    void cutnames(std::size_t most)
+    {
+        for (std::string& name : columns[kName].cells) {
+            name = fitted(name, most);
+        }
+    }
+
+    void write(std::ostream& out, const rows& lines, bool colour) const
+    {
+        std::array<std::size_t, kColumns> widths{};
+        std::transform(columns.begin(), columns.end(), widths.begin(),
+                       [](const column& each) { return each.width(); });
+        std::string header = "  ";
+        for (std::size_t i = 0; i < columns.size(); ++i) {
+            header += gapbefore(i);
+            header += filled(i, std::string(columns.at(i).header), widths.at(i));
+        }
+        out << tools::coloured(tools::kBold, header, colour) << '\n';
+        for (std::size_t line = 0; line < lines.size(); ++line) {
+            const look shown = lookof(lines[line]->now.what);
+            out << tools::coloured(shown.colour, std::string(1, shown.mark), colour) << ' ';
+            for (std::size_t i = 0; i < columns.size(); ++i) {
+                out << gapbefore(i)
+                    << tools::coloured(shown.colour,
+                                       filled(i, columns.at(i).cells[line], widths.at(i)),
+                                       colour && i == kState);
+            }
+            out << '\n';
+        }
+    }
+
+private:
+    static constexpr std::size_t kColumns = kShare + 1;
+    static constexpr std::size_t kMarkColumns = 2;
+
+    static std::string_view gapbefore(std::size_t place) noexcept
+    {
+        return place == kName ? "" : place <= kLast ? "  " : " ";
+    }
+
+    [[nodiscard]] std::string filled(std::size_t place, std::string text, std::size_t width) const
+    {
+        return columns.at(place).right ? filledbefore(std::move(text), width)
+                                       : filledbehind(std::move(text), width);
+    }
+
+    void add(const account& service)
+    {
+        const auto put = [this](place where, std::string text) {
+            columns.at(where).cells.push_back(std::move(text));
+        };
+        const state now = service.now.what;
+        put(kName, fitted(service.name, std::string::npos));
+        put(kState, std::string(how.fullwords ? wordof(now) : lookof(now).shortword));
+        put(kSince, (service.now.inferred ? '~' : ' ') + timetext(service.now.from));
+        put(kLast, lastoutage(service));
+        put(kOutages, shortcount(service.outages));
+        put(kRecoveries, fmt::format("{}/{}", shortcount(service.recoveriessuccessful),
+                                     shortcount(service.recoveriestried)));
+        put(kSkips, shortcount(service.skippedchecks));
+        put(kShare, sharetext(service.availability()));
+    }
+
+    [[nodiscard]] std::string timetext(const instant& when) const
+    {
+        return how.fulltimes ? clocktext(when) : shorttime(when, seen.judged);
+    }
+
+    // When it began and how long it took; one that lasts has taken longer than that.
+    [[nodiscard]] std::string lastoutage(const account& service) const
+    {
+        if (!service.lastoutage) {
+            return "-";
+        }
+        const outage& last = *service.lastoutage;
+        const std::int64_t seconds = secondsbetween(last.from, last.to.value_or(seen.judged));
+        const std::size_t width = how.fulltimes ? 14 : 7; // ">59 min 59 s", ">59m59s"
+        return timetext(last.from) + ' ' +
+               filledbefore((last.to ? "" : ">") +
+                                (how.fulltimes ? spantext(seconds) : shortspan(seconds)),
+                            width);
+    }
+
+    const overview& seen;
+    room how;
+    std::array<column, kColumns> columns{{{"SERVICE"},
+                                          {"STATE"},
+                                          {" SINCE"},
+                                          {"LAST OUTAGE"},
+                                          {"OUTAGES", true},
+                                          {"RECOV", true},
+                                          {"SKIPS", true},
+                                          {"AVAIL", true}}};
+};
+
+void writetable(std::ostream& out, const overview& seen, std::size_t columns, bool colour)
+{
+    const rows lines = sorted(seen.services);
+    for (const room& each : kRooms) {
+        table tried(seen, lines, each);
+        const std::size_t rest = tried.widthwithoutnames();
+        const bool last = &each == &kRooms.back();
+        if (rest + tried.namewidth() <= columns || last) {
+            tried.cutnames(std::max(kLeastNameColumns, columns - std::min(columns, rest)));
+            tried.write(out, lines, colour);
+            return;
+        }
+    }
+}
+
+std::string counted(std::uint64_t count, std::string_view one, std::string_view many)
+{
+    return fmt::format("{} {}", count, count == 1 ? one : many);
+}
+
+// What is no line of the daemon's, or no whole one.
+std::string oddwords(const readcount& count)
+{
+    std::vector<std::string> words;
+    if (count.foreign > 0) {
+        words.push_back(counted(count.foreign, "is another's", "are others'"));
+    }
+    if (count.torn > 0) {
+        words.push_back(counted(count.torn, "is torn", "are torn"));
+    }
+    return fmt::format("{}", fmt::join(words, ", "));
+}
+
+void writesources(std::ostream& out, const overview& seen)
+{
+    const readcount& count = seen.count;
+    if (count.messages == 0) {
+        out << "no message of tolkwd in " << counted(count.lines, "line", "lines") << '\n';
+        return;
+    }
+    out << fmt::format("log from {} to {}, {}\n", clocktext(count.first), clocktext(count.last),
+                       counted(count.lines, "line", "lines"));
+    const std::string oddities = oddwords(count);
+    if (!oddities.empty()) {
+        out << "  of these " << oddities << '\n';
+    }
+    if (count.clockchanges > 0) {
+        out << "the clock was set back " << counted(count.clockchanges, "time", "times")
+            << ": times above may repeat\n";
+    }
+    if (seen.asofnow) {
+        out << fmt::format("judged as of {}, {} after the last line\n", clocktext(seen.judged),
+                           spantext(secondsbetween(count.last, seen.judged)));
+    }
+}
+
+// "web, db and 3 more".
+std::string named(const std::vector<std::string>& names)
+{
+    constexpr std::size_t kMostNames = 3;
+    const auto shown = static_cast<std::ptrdiff_t>(std::min(names.size(), kMostNames));
+    std::string text = fmt::format("{}", fmt::join(names.begin(), names.begin() + shown, ", "));
+    return names.size() > kMostNames ? text + fmt::format(" and {} more", names.size() - kMostNames)
+                                     : text;
+}
+
+// The log ends within the retries of these services, which are over by now.
+std::vector<std::string> silentsincefailure(const overview& seen)
+{
+    constexpr std::size_t kNameColumns = 16;
+    std::vector<std::string> names;
+    for (const account& each : seen.services) {
+        const bool retrying =
+            each.now.what == state::kSuspect || each.now.what == state::kFunctionalFailure;
+        if (retrying && !seen.asofnow &&
+            secondsbetween(each.now.from, seen.present) > kSilenceSeconds) {
+            names.push_back(fitted(each.name, kNameColumns));
+        }
+    }
+    return names;
+}
+
+void writecautions(std::ostream& out, const overview& seen)
+{
+    const auto inferred = [](const account& each) {
+        return each.now.inferred;
+    };
+    if (std::any_of(seen.services.begin(), seen.services.end(), inferred)) {
+        out << "~ inferred: no message says so, or when\n";
+    }
+    const std::vector<std::string> silent = silentsincefailure(seen);
+    if (!silent.empty()) {
+        out << "no word since the failure: " << named(silent)
+            << "\n  a retry that succeeds leaves no message; --now judges as of the present\n";
+    }
+}
+
+} // namespace
+
+void writestatus(std::ostream& out, const overview& seen, std::size_t columns, bool colour)
+{
+    if (seen.loadfailed) {
+        out << tools::coloured(tools::kRed,
+                               "the configuration could not be loaded: nothing is watched until a "
+                               "refresh can",
+                               colour)
+            << '\n';
+    }
+    if (seen.services.empty()) {
+        out << "no service is named in the log\n";
+    } else {
+        writetable(out, seen, columns, colour);
+    }
+    out << '\n';
+    writesources(out, seen);
+    writecautions(out, seen);
+}
+
+int statusof(const overview& seen) noexcept
+{
+    const bool trouble = seen.loadfailed || seen.services.empty() ||
+                         std::any_of(seen.services.begin(), seen.services.end(),
+                                     [](const account& each) { return istrouble(each.now.what); });
+    return trouble ? 1 : 0;
+}
+
+} // namespace report
