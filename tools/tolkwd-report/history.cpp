@@ -1,0 +1,66 @@
+#include "history.h"
+
+#include "overview.h"
+#include "sources.h"
+
+namespace report {
+
+namespace {
+
+// Reader and tracker, and what they tell.
+class chain {
+public:
+    chain(wanted which, const eventlistener& told)
+        : model({.happened = [this, &told](const event& what) { told(what, nameof(what)); },
+                 .ended = {}}),
+          lines(which, [this](const message& said) { model.hear(said); })
+    {
+    }
+
+    logreader& reader() noexcept { return lines; }
+
+    const std::vector<account>& conclude()
+    {
+        model.conclude(lines.count().last, true);
+        return model.accounts();
+    }
+
+private:
+    [[nodiscard]] const std::string* nameof(const event& what) const
+    {
+        return what.service ? &model.accounts().at(*what.service).name : nullptr;
+    }
+
+    tracker model;
+    logreader lines;
+};
+
+} // namespace
+
+std::vector<account> readhistory(const std::vector<std::string>& names, wanted which,
+                                 const eventlistener& told)
+{
+    chain all(which, told);
+    readingalog([&] { readlogs(names, all.reader()); });
+    return all.conclude();
+}
+
+void followhistory(const std::vector<std::string>& names, wanted which, const eventlistener& told,
+                   const std::function<void()>& caughtup, const std::function<bool()>& proceed)
+{
+    chain all(which, told);
+    bool tillend = true; // nobody has ended it before
+    const auto asked = [&] {
+        tillend = proceed();
+        return tillend;
+    };
+    readingalog([&] {
+        readlogs({names.begin(), names.end() - 1}, all.reader());
+        followlog(names.back(), all.reader(), caughtup, asked);
+    });
+    if (tillend) {
+        all.conclude();
+    }
+}
+
+} // namespace report

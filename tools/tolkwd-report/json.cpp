@@ -1,0 +1,106 @@
+#include "json.h"
+
+#include "textjson.h"
+
+namespace report {
+
+namespace {
+
+using nlohmann::ordered_json;
+
+ordered_json spanjson(const readcount& count, const instant& when)
+{
+    return count.messages == 0 ? ordered_json() : ordered_json(isotext(when));
+}
+
+ordered_json logjson(const overview& seen)
+{
+    ordered_json files = ordered_json::array();
+    for (const std::string& name : seen.files) {
+        files.push_back(tools::textjson(name));
+    }
+    const readcount& count = seen.count;
+    return {{"files", files},
+            {"from", spanjson(count, count.first)},
+            {"to", spanjson(count, count.last)},
+            {"lines", count.lines},
+            {"messages", count.messages},
+            {"foreign", count.foreign},
+            {"torn", count.torn}};
+}
+
+ordered_json outagejson(const outage& last, const instant& judged)
+{
+    return {{"from", isotext(last.from)},
+            {"to", last.to ? ordered_json(isotext(*last.to)) : ordered_json()},
+            {"seconds", secondsbetween(last.from, last.to.value_or(judged))}};
+}
+
+ordered_json servicejson(const account& service, const instant& judged)
+{
+    const auto availability = service.availability();
+    return {{"service", tools::textjson(service.name)},
+            {"state", wordof(service.now.what)},
+            {"inferred", service.now.inferred},
+            {"since", isotext(service.now.from)},
+            {"seconds", secondsbetween(service.now.from, judged)},
+            {"path", service.path.empty() ? ordered_json() : tools::textjson(service.path)},
+            {"lastoutage",
+             service.lastoutage ? outagejson(*service.lastoutage, judged) : ordered_json()},
+            {"outages", service.outages},
+            {"outageseconds", service.outageseconds},
+            {"recoveries",
+             {{"tried", service.recoveriestried}, {"successful", service.recoveriessuccessful}}},
+            {"skippedchecks", service.skippedchecks},
+            {"gaveup", service.gaveup},
+            {"watchedseconds", service.watchedseconds},
+            {"availability", availability ? ordered_json(*availability) : ordered_json()}};
+}
+
+// The message as it was written, with the lines that belong to it.
+ordered_json saidjson(const message* said)
+{
+    if (said == nullptr) {
+        return {};
+    }
+    std::string text(said->text);
+    if (!said->more.empty()) {
+        text.append("\n").append(said->more);
+        text.erase(text.find_last_not_of('\n') + 1);
+    }
+    return tools::textjson(text);
+}
+
+} // namespace
+
+ordered_json statusjson(const overview& seen)
+{
+    ordered_json services = ordered_json::array();
+    for (const account& each : seen.services) {
+        services.push_back(servicejson(each, seen.judged));
+    }
+    return {{"version", kFormatVersion},
+            {"log", logjson(seen)},
+            {"loadfailed", seen.loadfailed},
+            {"services", services}};
+}
+
+ordered_json eventjson(const event& what, const std::string* name, std::string_view words)
+{
+    return {{"time", isotext(what.when)},
+            {"service", name == nullptr ? ordered_json() : tools::textjson(*name)},
+            {"state", what.became ? ordered_json(wordof(*what.became)) : ordered_json()},
+            {"kind", wordof(what.kind)},
+            {"inferred", what.inferred},
+            {"words", words},
+            {"message", saidjson(what.source)},
+            {"line", what.source == nullptr ? ordered_json() : ordered_json(what.source->line)}};
+}
+
+std::string textof(const ordered_json& document, int indent)
+{
+    constexpr bool kAsciiOnly = true; // some of the other characters are control characters
+    return document.dump(indent, ' ', kAsciiOnly);
+}
+
+} // namespace report
