@@ -1,0 +1,343 @@
+// tolkwd-report: answers from the daemon's log: what is up, what was down, since when, how often.
+// The command line, and what each sub-command does.
+
+#include <algorithm>
+#include <array>
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <ctime>
+#include <exception>
+#include <functional>
+#include <iostream>
+#include <iterator>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <system_error>
+#include <vector>
+
+#include <poll.h>
+#include <unistd.h>
+
+#include <CLI/CLI.hpp>
+#include <fmt/format.h>
+#include <fmt/ranges.h>
+
+#include "columns.h"
+#include "events.h"
+#include "history.h"
+#include "json.h"
+#include "messages.h"
+#include "newfile.h"
+#include "overview.h"
+#include "page.h"
+#include "pagecontents.h"
+#include "printable.h"
+#include "sources.h"
+#include "status.h"
+#include "terminal.h"
+#include "timeexpression.h"
+
+namespace {
+
+using namespace report;
+
+constexpr int kUnreadableStatus = 2;
+constexpr int kSignalStatus = 128;
+
+struct options {
+    std::vector<std::string> logs;
+    std::vector<std::string> services;
+    std::vector<std::string> kinds;
+    std::string since;
+    std::string until;
+    std::string page;
+    bool asofnow = false;
+    bool all = false;
+    bool follow = false;
+    bool json = false;
+    std::function<int(const options&)> run; // the sub-command
+};
+
+int runstatus(const options& chosen)
+{
+    const overview seen = readoverview(chosen.logs, chosen.asofnow, {});
+    if (chosen.json) {
+        std::cout << textof(statusjson(seen), 2) << '\n';
+    } else {
+        writestatus(std::cout, seen, outputcolumns(), tools::colourwanted());
+    }
+    return statusof(seen);
+}
+
+// The expressions have been checked before.
+eventfilter filterof(const options& chosen)
+{
+    eventfilter filter{.services = {chosen.services.begin(), chosen.services.end()},
+                       .all = chosen.all};
+    for (const std::string& word : chosen.kinds) {
+        if (const auto kind = eventkindof(word)) {
+            filter.kinds.insert(*kind);
+        }
+    }
+    const std::time_t now = std::time(nullptr);
+    filter.since = clockof(chosen.since, now);
+    filter.until = clockof(chosen.until, now);
+    return filter;
+}
+
+eventform formof(const options& chosen)
+{
+    if (chosen.json) {
+        return chosen.follow ? eventform::kLines : eventform::kDocument;
+    }
+    return tools::colourwanted() ? eventform::kColouredText : eventform::kText;
+}
+
+// Whether somebody can still read what is written.
+bool hasreader()
+{
+    pollfd output{STDOUT_FILENO, 0, 0};
+    return poll(&output, 1, 0) <= 0;
+}
+
+// As if it had written to a reader that is gone.
+int endwithoutreader()
+{
+    (void)std::raise(SIGPIPE);
+    return kSignalStatus + SIGPIPE; // whoever started this has it ignored
+}
+
+// A name that nobody has may be misspelt.
+void noteunknown(const options& chosen, const std::vector<account>& known)
+{
+    for (const std::string& name : chosen.services) {
+        const bool found = std::any_of(known.begin(), known.end(),
+                                       [&](const account& each) { return each.name == name; });
+        if (!found) {
+            std::cerr << "tolkwd-report: the log names no service " << tools::inquotes(name)
+                      << '\n';
+        }
+    }
+}
+
+int runevents(const options& chosen)
+{
+    const eventfilter filter = filterof(chosen);
+    const wanted which = filter.all || !filter.kinds.empty() ? wanted::kAll : wanted::kWhatMatters;
+    eventwriter writer(std::cout, filter, formof(chosen));
+    const auto told = [&writer](const event& what, const std::string* name) {
+        writer.told(what, name);
+    };
+    if (!chosen.follow) {
+        noteunknown(chosen, readhistory(chosen.logs, which, told));
+        writer.end();
+        return 0;
+    }
+    followhistory(
+        chosen.logs, which, told, [&writer] { writer.flush(); }, hasreader);
+    return hasreader() ? 0 : endwithoutreader();
+}
+
+int runhtml(const options& chosen)
+{
+    const pagecontents contents = readpage(chosen.logs, chosen.asofnow);
+    writewhole(chosen.page, [&](std::ostream& out) { writepage(out, contents); });
+    return 0;
+}
+
+int runmessages(const options& /*chosen*/)
+{
+    writemessages(std::cout, messageforms());
+    return 0;
+}
+
+// Of a word on the command line that it does not understand, CLI11 repeats every byte.
+std::string refusal(const CLI::App* /*app*/, const CLI::Error& error)
+{
+    return tools::printable(error.what()) + "\nRun with --help for more information.\n";
+}
+
+const CLI::Validator& akind()
+{
+    static const CLI::Validator check(
+        [](std::string& word) {
+            return eventkindof(word)
+                       ? std::string()
+                       : fmt::format("{} is no kind of event; these are: {}", tools::inquotes(word),
+                                     fmt::join(eventkindwords(), ", "));
+        },
+        "", "kind");
+    return check;
+}
+
+const CLI::Validator& atime()
+{
+    static const CLI::Validator check(
+        [](std::string& text) {
+            return clockof(text, std::time(nullptr))
+                       ? std::string()
+                       : fmt::format("{} is no time; understood are {}", tools::inquotes(text),
+                                     fmt::join(kTimeExamples, ", "));
+        },
+        "", "time");
+    return check;
+}
+
+// `items` in lines that a terminal shows whole, with commas between.
+template <typename Items>
+std::string listed(const Items& items)
+{
+    constexpr std::size_t kColumns = 80;
+    std::string lines;
+    std::string line = " ";
+    for (const auto& item : items) {
+        if (line.size() + item.size() + 2 > kColumns) {
+            lines.append(line).append("\n");
+            line = " ";
+        }
+        line.append(" ").append(item).append(&item == &*std::prev(std::end(items)) ? "" : ",");
+    }
+    return lines + line;
+}
+
+void addlogs(CLI::App& command, options& chosen)
+{
+    command
+        .add_option("LOG", chosen.logs,
+                    fmt::format("Logs, oldest first; - is standard input [{}]", kDefaultLog))
+        ->type_name("");
+}
+
+void addasofnow(CLI::App& command, options& chosen)
+{
+    command.add_flag("--now", chosen.asofnow,
+                     "Judge as of the present, not of the log's last line");
+}
+
+void addjson(CLI::App& command, options& chosen, const char* what)
+{
+    command.add_flag("--json", chosen.json, what);
+}
+
+void addstatus(CLI::App& app, options& chosen)
+{
+    CLI::App& command = *app.add_subcommand("status", "Tell how each service is, and was");
+    addlogs(command, chosen);
+    addasofnow(command, chosen);
+    addjson(command, chosen, "Write one JSON object");
+    command.footer(
+        "While all is well a daemon may write nothing for long; a log does not tell that\n"
+        "from its end. A state marked with ~ is inferred: no message says so, or when.\n\n"
+        "Exit status: 0 where all services are up, busy or not watched, 1 where somebody\n"
+        "should look, 2 where a log cannot be read.");
+    command.callback([&chosen] { chosen.run = runstatus; });
+}
+
+void addeventfilters(CLI::App& command, options& chosen)
+{
+    command.add_option("--service", chosen.services, "Only of this service; repeatable")
+        ->type_name("NAME")
+        ->allow_extra_args(false);
+    command.add_option("--kind", chosen.kinds, "Only of this kind; repeatable")
+        ->type_name("KIND")
+        ->allow_extra_args(false)
+        ->check(akind());
+    command.add_option("--since", chosen.since, "Only from this time on")
+        ->type_name("WHEN")
+        ->check(atime());
+    command.add_option("--until", chosen.until, "Only up to this time")
+        ->type_name("WHEN")
+        ->check(atime());
+    command.add_flag("--all", chosen.all, "Also what is routine: checks, figures and all steps");
+}
+
+void addevents(CLI::App& app, options& chosen)
+{
+    CLI::App& command = *app.add_subcommand("events", "Tell what happened, a line for each event");
+    addlogs(command, chosen);
+    addeventfilters(command, chosen);
+    command.add_flag("--follow", chosen.follow, "Go on as the last log grows");
+    addjson(command, chosen, "Write one JSON object; with --follow, one a line");
+    command.footer(fmt::format(
+        "KIND:\n{}\nWHEN, on the log's clock; a day alone is its beginning:\n{}\n\n"
+        "A line marked with ~ is inferred: no message says so, or when. It stands where\n"
+        "the log makes it certain.",
+        listed(eventkindwords()), listed(kTimeExamples)));
+    command.callback([&chosen] { chosen.run = runevents; });
+}
+
+void addhtml(CLI::App& app, options& chosen)
+{
+    CLI::App& command =
+        *app.add_subcommand("html", "Make a page with a time line for each service");
+    addlogs(command, chosen);
+    command.add_option("-o", chosen.page, "The page's file; - for standard output")
+        ->type_name("FILE")
+        ->required();
+    addasofnow(command, chosen);
+    command.callback([&chosen] { chosen.run = runhtml; });
+}
+
+void addmessages(CLI::App& app, options& chosen)
+{
+    app.add_subcommand("messages", "List the daemon's messages, and what they mean")
+        ->callback([&chosen] { chosen.run = runmessages; });
+}
+
+// Ends the process where the command line is wrong, or asks for nothing but help.
+options parse(int argc, char** argv)
+{
+    CLI::App app("Answers from tolkwd's log: what is up, what was down, since when, how often.",
+                 "tolkwd-report");
+    options chosen;
+    addstatus(app, chosen);
+    addevents(app, chosen);
+    addhtml(app, chosen);
+    addmessages(app, chosen);
+    app.require_subcommand(0, 1); // a word in its place is refused by its name
+    app.set_version_flag("--version", "tolkwd-report " TOLKWD_VERSION);
+    app.failure_message(refusal);
+    try {
+        app.parse(argc, argv);
+        if (!chosen.run) {
+            throw CLI::RequiredError("one of status, events, html and messages");
+        }
+    } catch (const CLI::ParseError& error) {
+        std::exit(app.exit(error) == 0 ? tools::delivered(0) : tools::kUsageStatus);
+    }
+    if (chosen.logs.empty()) {
+        chosen.logs.emplace_back(kDefaultLog);
+    }
+    return chosen;
+}
+
+// What `work` returns, if all that it says has been written.
+int guarded(const std::function<int()>& work)
+{
+    try {
+        return tools::delivered(work());
+    } catch (const unreadablelog& error) {
+        (void)std::fprintf(stderr,
+                           "tolkwd-report: %s\n"
+                           "Give the log's name, or - for standard input: "
+                           "journalctl -u tolkwd -o cat | tolkwd-report status -\n",
+                           error.what());
+        return kUnreadableStatus;
+    } catch (const std::exception& error) {
+        (void)std::fprintf(stderr, "tolkwd-report: %s\n", tools::printable(error.what()).c_str());
+        return tools::kFailureStatus;
+    }
+}
+
+} // namespace
+
+int main(int argc, char** argv)
+{
+    std::ios::sync_with_stdio(false);
+    return guarded([&] {
+        const options chosen = parse(argc, argv);
+        return chosen.run(chosen);
+    });
+}
