@@ -29,7 +29,14 @@ esac
 if [ $# -eq 0 ]; then
     setup build demo
     build release -DBUILD_TESTING=OFF
-    exec "$root/scripts/demo/run.sh" "$root/build/release/src/tolkwd"
+    "$root/scripts/demo/run.sh" "$root/build/release/src/tolkwd" "$root/build/demo"
+    cat <<'TEXT'
+
+Its log is kept. What it tells, as a table and as a page to open in a browser:
+    build/release/tools/tolkwd-report/tolkwd-report status build/demo/tolkwd.log
+    build/release/tools/tolkwd-report/tolkwd-report html -o outage.html build/demo/tolkwd.log
+TEXT
+    exit
 fi
 
 # Standard output belongs to the daemon's log.
