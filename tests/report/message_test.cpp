@@ -143,8 +143,7 @@ TEST(MessageForms, TellWhatTheyMean)
 TEST(Matters, WhatStandsInALogWithoutDebugLinesDoes)
 {
     // What such a log has besides says nothing new about a state.
-    const std::set<messageid> silent = {messageid::kNotConfigured, messageid::kCannotSkip,
-                                        messageid::kNoFigures};
+    const std::set<messageid> silent = {messageid::kNotConfigured};
     for (const messageform& form : messageforms()) {
         if (form.level != loglevel::kDebug) {
             EXPECT_EQ(matters(form.id), !silent.contains(form.id)) << form.text;

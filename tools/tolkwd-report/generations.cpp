@@ -7,7 +7,49 @@ namespace {
 // From a thread's first debug line to its announcement.
 constexpr std::int64_t kEntrySeconds = 5;
 
+bool isrefresh(messageid id) noexcept
+{
+    switch (id) {
+    case messageid::kRefreshBegins:
+    case messageid::kBeforeJoin:
+    case messageid::kAfterJoin:
+    case messageid::kThreadJoined:
+    case messageid::kThreadLeft:
+        return true;
+    default:
+        return false;
+    }
+}
+
+// The debug lines that tell something: one of them comes with each ping.
+bool isstep(messageid id) noexcept
+{
+    switch (id) {
+    case messageid::kPingSucceeded:
+    case messageid::kPingSucceededByStatus:
+    case messageid::kStatusAnswered:
+    case messageid::kCheckSucceeded:
+        return true;
+    default:
+        return false;
+    }
+}
+
 } // namespace
+
+void generations::hear(messageid id, const instant& when) noexcept
+{
+    if (isrefresh(id)) {
+        steps = true;
+        refreshed = true;
+    } else if (isstep(id)) {
+        steps = true;
+    } else if (id == messageid::kThreadEntered) {
+        steps = true;
+        entered = when;
+        hasentered = true;
+    }
+}
 
 void generations::endwithdaemon() noexcept
 {
@@ -36,25 +78,6 @@ generations::start generations::announced(const instant& when, bool threadagain,
     over = false;
     ended = false;
     return result;
-}
-
-void generations::hearstep(messageid id, const instant& when) noexcept
-{
-    switch (id) {
-    case messageid::kThreadEntered:
-        hasentered = true;
-        entered = when;
-        break;
-    case messageid::kRefreshBegins:
-    case messageid::kBeforeJoin:
-    case messageid::kAfterJoin:
-    case messageid::kThreadJoined:
-    case messageid::kThreadLeft:
-        refreshed = true;
-        break;
-    default:
-        break;
-    }
 }
 
 // Whoever writes debug lines tells of a refresh, too.

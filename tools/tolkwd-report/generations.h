@@ -31,14 +31,8 @@ public:
         kEither,    // one of these two
     };
 
-    // A message of any kind. Cheap.
-    void hear(messageid id, loglevel level, const instant& when) noexcept
-    {
-        if (level == loglevel::kDebug) {
-            steps = true;
-            hearstep(id, when);
-        }
-    }
+    // A message of any kind.
+    void hear(messageid id, const instant& when) noexcept;
 
     // The configuration could not be loaded, or the daemon has ended: what is announced next is a
     // new generation.
@@ -62,7 +56,6 @@ public:
     }
 
 private:
-    void hearstep(messageid id, const instant& when) noexcept;
     [[nodiscard]] start kindofstart(bool anything) const noexcept;
 
     std::uint32_t count = 0;

@@ -85,20 +85,17 @@ enum class messageid : std::uint8_t {
     kForeign, // no message of the daemon's
 };
 
-// Whether such a message may change what is known of a service's state, or of whether anything is
-// watched. All others are steps on the way, figures and the listing. Any thread.
+// Whether such a message may change what is known of a service's state, of whether anything is
+// watched, or of who speaks and whether debug lines are on. All others are steps on the way,
+// figures and the listing. Any thread.
 constexpr bool matters(messageid id) noexcept
 {
     switch (id) {
-    case messageid::kThreadEntered:
     case messageid::kThreadCreated:
-    case messageid::kBeforeJoin:
-    case messageid::kAfterJoin:
     case messageid::kListing:
     case messageid::kPingBegins:
     case messageid::kPingAsks:
     case messageid::kNoStatusFile:
-    case messageid::kStatusAnswered:
     case messageid::kPingFailed:
     case messageid::kPingUnknown:
     case messageid::kPingUnclear:
@@ -118,8 +115,6 @@ constexpr bool matters(messageid id) noexcept
     case messageid::kCheckUnclear:
     case messageid::kCheckRetry:
     case messageid::kFunctionalPause:
-    case messageid::kCannotSkip:
-    case messageid::kNoFigures:
     case messageid::kFigures:
     case messageid::kForeign:
         return false;

@@ -171,7 +171,7 @@ void servicestate::announce(const instant& when, bool steps, turns& told)
 {
     settlesilence(when, steps, told);
     if (isfresh(when)) { // announced twice: the first one has told nothing
-        refute(told);
+        refute(when, told);
     }
     if (checkopen && now.what == state::kCommandNotRecognised) {
         settle(when, told);
@@ -244,7 +244,7 @@ void servicestate::checkskipped(const instant& when, turns& told)
 {
     ++skippedchecks;
     if (isfresh(when) && held && held->what == state::kBusy) {
-        refute(told);
+        refute(when, told);
     }
     certify(when);
     settle(when, told);
@@ -255,7 +255,7 @@ void servicestate::checkskipped(const instant& when, turns& told)
 void servicestate::fails(state into, const instant& when, turns& told)
 {
     if (isfresh(when)) {
-        refute(told);
+        refute(when, told);
     } else {
         settle(when, told);
     }
@@ -271,7 +271,7 @@ void servicestate::checkfails(state into, const instant& when, turns& told)
     const bool doubted = isfresh(when) || open == doubt::kUnchecked || open == doubt::kBeingChecked;
     const bool goeson = held && (held->what == into || (isoutage(held->what) && isoutage(into)));
     if (doubted && goeson) {
-        refute(told);
+        refute(when, told);
     } else {
         certify(when);
         settle(when, told);
@@ -312,7 +312,7 @@ void servicestate::troubled(state into, const instant& when, turns& told)
 {
     checkopen = false;
     if (isfresh(when)) {
-        refute(told);
+        refute(when, told);
     }
     beginbymessage(into, when, told);
 }
@@ -371,8 +371,8 @@ void servicestate::settlesilence(const instant& when, bool steps, turns& told)
     }
 }
 
-// What is now has never begun: what was before goes on.
-void servicestate::refute(turns& told)
+// What is now has never begun: what was before goes on, at least until `when`.
+void servicestate::refute(const instant& when, turns& told)
 {
     if (!told.begun.empty()) {
         told.begun.pop_back();
@@ -381,6 +381,7 @@ void servicestate::refute(turns& told)
     if (held) {
         now = *held;
         held.reset();
+        least = when;
     } else {
         known = false;
     }
@@ -389,11 +390,11 @@ void servicestate::refute(turns& told)
 void servicestate::begin(const beginning& next, turns& told)
 {
     beginning begun = next;
-    if (known && secondsbetween(now.from, begun.when) < 0) {
-        begun.when = now.from;
+    if (known && secondsbetween(least, begun.when) < 0) {
+        begun.when = least;
     }
     if (known && now.what != begun.what && now.from.elapsed == begun.when.elapsed) {
-        refute(told); // it would be an empty span
+        refute(begun.when, told); // it would be an empty span
     }
     open = doubt::kNone;
     if (known && now.what == begun.what) {
@@ -410,6 +411,7 @@ void servicestate::begin(const beginning& next, turns& told)
     }
     known = true;
     now = {begun.what, begun.when, begun.when, begun.inferred};
+    least = begun.when;
     told.begun.push_back(begun);
 }
 

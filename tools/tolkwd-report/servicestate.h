@@ -98,7 +98,7 @@ private:
     void settle(const instant& when, turns& told);
     void settleretry(const instant& when, turns& told);
     void settlesilence(const instant& when, bool steps, turns& told);
-    void refute(turns& told);
+    void refute(const instant& when, turns& told);
     void begin(const beginning& next, turns& told);
     void beginbymessage(state what, const instant& when, turns& told);
     void count(const span& over);
@@ -108,6 +108,7 @@ private:
     bool recoveryannounced = false; // a functional recovery: its general part is to be named yet
     doubt open = doubt::kNone;
     span now;
+    instant least;            // `now` lasts until then
     std::optional<span> held; // the one before, not told yet
     instant announced;
     instant failed;

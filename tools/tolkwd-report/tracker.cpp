@@ -262,7 +262,10 @@ private:
 void tracker::work::hear(const message& said)
 {
     advance(said.when);
-    generation.hear(said.id, said.level, last);
+    if (!listens.happened && waiting.empty() && !matters(said.id)) {
+        return; // most debug lines
+    }
+    generation.hear(said.id, last);
     if (!waiting.empty()) {
         watchwaiting(&said);
     }
@@ -295,7 +298,9 @@ void tracker::work::hear(const message& said)
 
 void tracker::work::conclude(const instant& when, bool final)
 {
-    watchwaiting(nullptr);
+    if (final) {
+        watchwaiting(nullptr);
+    }
     const instant end = started && secondsbetween(last, when) < 0 ? last : when;
     for (serviceid service = 0; service < services.size(); ++service) {
         conclude(service, end, final);
@@ -447,18 +452,16 @@ void tracker::work::daemonended(const message& said)
 
 void tracker::work::statetold(const std::optional<serviceid>& service, const message& said)
 {
-    eventkind kind = kindof(said.id);
+    bool again = false;
     if (service && servicestate::tells(said.id)) {
         watched& one = services[*service];
         one.seen = generation.number();
         one.course.hear(said.id, last, generation.hassteps(), told);
-        if (said.id == messageid::kRecoveryTried &&
-            one.course.current() == state::kFunctionalRecovering) {
-            kind = eventkind::kStep; // named before as the functional one
-        }
+        again = said.id == messageid::kRecoveryTried &&
+                one.course.current() == state::kFunctionalRecovering;
         tellturns(*service);
     }
-    tell(service, said, kind);
+    tell(service, said, again ? eventkind::kStep : kindof(said.id)); // a recovery is told once
 }
 
 std::optional<serviceid> tracker::work::speaker(std::uint64_t thread) const noexcept
