@@ -9,13 +9,8 @@ namespace report {
 
 namespace {
 
-constexpr std::int64_t kMinuteSeconds = 60;
 constexpr std::int64_t kHourSeconds = 3600;
 constexpr std::int64_t kDaySeconds = 86400;
-
-// Nothing elapses beyond this. No real clock comes there, but one that is set back again and again
-// over thousands of years would.
-constexpr std::int64_t kEndOfTime = 1'000'000'000'000'000;
 
 constexpr std::string_view kDays = "SunMonTueWedThuFriSat";
 constexpr std::string_view kMonths = "JanFebMarAprMayJunJulAugSepOctNovDec";
@@ -52,18 +47,6 @@ int numberof(std::string_view text, bool blankfirst = false)
         value = value * 10 + (byte - '0');
     }
     return value;
-}
-
-// "MM:SS" within an hour, in seconds; -1 where it is no time.
-std::int64_t withinhour(const char* text) noexcept
-{
-    if (!isdigit(text[0]) || text[0] > '5' || !isdigit(text[1]) || text[2] != ':' ||
-        !isdigit(text[3]) || text[3] > '5' || !isdigit(text[4])) {
-        return -1;
-    }
-    const int minutes = (text[0] - '0') * 10 + (text[1] - '0');
-    const int seconds = (text[3] - '0') * 10 + (text[4] - '0');
-    return minutes * kMinuteSeconds + seconds;
 }
 
 // The beginning of the hour of "Sat Nov 21 15:" and " 2026".
@@ -122,26 +105,19 @@ logclock::logclock()
     tzset();
 }
 
-std::optional<std::int64_t> logclock::read(const char* date) noexcept
+bool logclock::readhour(const char* date) noexcept
 {
-    const std::int64_t seconds = withinhour(date + kHourBytes);
-    if (seconds < 0) {
-        return std::nullopt;
+    const auto hour = hourof({date, kHourBytes}, {date + kYearAt, kYearBytes});
+    if (!hour) {
+        return false;
     }
-    if (std::memcmp(date, hourtext.data(), kHourBytes) != 0 ||
-        std::memcmp(date + kYearAt, yeartext.data(), kYearBytes) != 0) {
-        const auto hour = hourof({date, kHourBytes}, {date + kYearAt, kYearBytes});
-        if (!hour) {
-            return std::nullopt;
-        }
-        std::memcpy(hourtext.data(), date, kHourBytes);
-        std::memcpy(yeartext.data(), date + kYearAt, kYearBytes);
-        hourclock = *hour;
-    }
-    return hourclock + seconds;
+    std::memcpy(hourtext.data(), date, kHourBytes);
+    std::memcpy(yeartext.data(), date + kYearAt, kYearBytes);
+    hourclock = *hour;
+    return true;
 }
 
-instant logclock::advance(std::int64_t clock)
+instant logclock::advancefar(std::int64_t clock)
 {
     const std::int64_t utc = utcof(clock);
     if (!begun) {

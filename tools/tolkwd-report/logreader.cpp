@@ -7,8 +7,10 @@
 #include <optional>
 #include <utility>
 
+#include "bytes.h"
 #include "logclock.h"
 #include "recogniser.h"
+#include "textmemo.h"
 
 namespace report {
 
@@ -27,6 +29,9 @@ constexpr std::string_view kExportMessage = "MESSAGE";
 constexpr std::size_t kExportLengthBytes = 8;
 constexpr std::size_t kLongestFieldNameBytes = 64;
 
+constexpr std::array<std::uint64_t, kWordBytes + 1> kPowersOfTen = {
+    1, 10, 100, 1'000, 10'000, 100'000, 1'000'000, 10'000'000, 100'000'000};
+
 constexpr bool isdigit(char byte) noexcept
 {
     return byte >= '0' && byte <= '9';
@@ -36,9 +41,41 @@ constexpr bool isdigit(char byte) noexcept
 struct linehead {
     std::int64_t clock = 0;
     speakerid who = recogniser::kNobody;
-    std::uint64_t thread = 0;
-    std::size_t bytes = 0; // its length
+    std::string_view thread{}; // its digits
+    std::size_t bytes = 0;     // the head's length
 };
+
+// Of a line whose end was turned into two bytes on another system.
+std::string_view withoutreturn(std::string_view line)
+{
+    return line.substr(0, line.size() - (line.ends_with('\r') ? 1 : 0));
+}
+
+// The number of a thread that `text` begins with, as its digits; empty where there is none, or a
+// blank does not follow it.
+std::string_view threadin(std::string_view text)
+{
+    constexpr std::string_view kMost = "18446744073709551615";
+    std::size_t size = 0;
+    for (std::size_t digits = kWordBytes; digits == kWordBytes && size <= kMost.size();) {
+        digits = digitsin(wordof(text, size));
+        size += digits;
+    }
+    const std::string_view thread = text.substr(0, size);
+    const bool fits = size < kMost.size() || (size == kMost.size() && thread <= kMost);
+    return fits && size < text.size() && text[size] == ' ' ? thread : "";
+}
+
+std::uint64_t numberof(std::string_view digits)
+{
+    std::uint64_t value = 0;
+    while (!digits.empty()) {
+        const std::size_t size = std::min(digits.size(), kWordBytes);
+        value = value * kPowersOfTen[size] + numberin(wordof(digits, 0), size);
+        digits.remove_prefix(size);
+    }
+    return value;
+}
 
 // Who wrote a line, by the journal: the "tolkwd[123]: " that its prefix ends in.
 std::string_view writerin(std::string_view prefix)
@@ -105,6 +142,7 @@ private:
     const bool everything;
     const listener told;
     const recogniser& known = recogniser::ofall();
+    textmemo memo;
     const speakerid standarderror = known.speakerof(loglevel::kStandardError, {});
 
     part at = part::kLine;
@@ -122,7 +160,9 @@ private:
     bool isheld = false;  // `held` holds a message
     heldmessage held;
 
+    std::string_view takelines(std::string_view bytes);
     std::string_view takeline(std::string_view bytes);
+    std::string_view takerest(std::string_view bytes);
     std::string_view takelength(std::string_view bytes);
     std::string_view takefield(std::string_view bytes);
     void keep(std::string_view piece);
@@ -133,13 +173,15 @@ private:
     void readline(std::string_view text);
     void readexported(std::string_view text);
     void readentry(std::string_view text);
-    void readlogged(std::string_view text, std::string_view from);
+    void readlogged(linehead head, std::string_view text, std::string_view from);
     void readunlogged(std::string_view text);
     void follow(std::string_view text);
 
     bool readhead(std::string_view text, linehead& head);
     std::size_t findhead(std::string_view text);
-    bool istorn(const recogniser::found& found, std::string_view text);
+    std::size_t findnext(const recogniser::found& found, std::string_view text);
+    void takeknown(const linehead& head, const textmemo::known& same, std::string_view text,
+                   std::string_view from);
     void take(const linehead& head, const recogniser::found& found, std::string_view text,
               std::string_view from);
     void holdunwhole(const linehead& head, std::string_view text, std::string_view from);
@@ -159,7 +201,11 @@ void logreader::work::feed(std::string_view bytes)
     while (!bytes.empty()) {
         switch (at) {
         case part::kLine:
-            bytes = takeline(bytes);
+            if (!partial.empty() || overlong) {
+                bytes = takerest(bytes);
+            } else {
+                bytes = takeline(exported ? bytes : takelines(bytes));
+            }
             break;
         case part::kFieldLength:
             bytes = takelength(bytes);
@@ -178,6 +224,24 @@ void logreader::work::feed(std::string_view bytes)
     }
 }
 
+// Nearly all lines begin with a head, and stand whole in what was given. Returns what stands behind
+// them.
+std::string_view logreader::work::takelines(std::string_view bytes)
+{
+    linehead head;
+    while (readhead(bytes, head)) { // it holds no newline
+        const std::size_t end = bytes.find('\n', head.bytes);
+        if (end > kLongestLineBytes) {
+            break;
+        }
+        line = ++count.lines;
+        isfirst = false;
+        readlogged(head, withoutreturn(bytes.substr(0, end)), {});
+        bytes.remove_prefix(end + 1);
+    }
+    return bytes;
+}
+
 // Returns what stands behind the line.
 std::string_view logreader::work::takeline(std::string_view bytes)
 {
@@ -186,13 +250,19 @@ std::string_view logreader::work::takeline(std::string_view bytes)
         keep(bytes);
         return {};
     }
-    const std::string_view piece = bytes.substr(0, end);
-    if (partial.empty() && !overlong) {
-        endline(piece);
-    } else {
-        keep(piece);
-        endpartial();
+    endline(bytes.substr(0, end));
+    return bytes.substr(end + 1);
+}
+
+// The same of a line whose beginning has been kept.
+std::string_view logreader::work::takerest(std::string_view bytes)
+{
+    const std::size_t end = bytes.find('\n');
+    keep(bytes.substr(0, end));
+    if (end == std::string_view::npos) {
+        return {};
     }
+    endpartial();
     return bytes.substr(end + 1);
 }
 
@@ -278,9 +348,7 @@ void logreader::work::endfield()
 
 void logreader::work::readline(std::string_view text)
 {
-    if (text.ends_with('\r')) {
-        text.remove_suffix(1);
-    }
+    text = withoutreturn(text);
     exported = exported || (isfirst && text.starts_with(kExportBegins));
     if (exported) {
         readexported(text);
@@ -315,7 +383,7 @@ void logreader::work::readentry(std::string_view text)
 {
     linehead head;
     if (readhead(text, head)) {
-        readlogged(text, {});
+        readlogged(head, text, {});
         return;
     }
     const std::string_view prefixes = text.substr(0, kLongestPrefixBytes);
@@ -323,7 +391,7 @@ void logreader::work::readentry(std::string_view text)
          end = prefixes.find(kPrefixEnd, end + 1)) {
         const std::size_t begin = end + kPrefixEnd.size();
         if (readhead(text.substr(begin), head)) {
-            readlogged(text.substr(begin), writerin(text.substr(0, begin)));
+            readlogged(head, text.substr(begin), writerin(text.substr(0, begin)));
             return;
         }
     }
@@ -331,23 +399,42 @@ void logreader::work::readentry(std::string_view text)
 }
 
 // A text that begins with a head, and may hold others where writing was cut off before them.
-void logreader::work::readlogged(std::string_view text, std::string_view from)
+void logreader::work::readlogged(linehead head, std::string_view text, std::string_view from)
 {
     for (;;) {
         settle();
-        linehead head;
-        readhead(text, head);
         const std::string_view said = text.substr(head.bytes);
+        if (const auto* const same = memo.find(head.who, said)) {
+            takeknown(head, *same, said, from);
+            return;
+        }
         const recogniser::found found = known.find(head.who, said);
-        const std::size_t next =
-            found.form == nullptr || istorn(found, said) ? findhead(said) : std::string_view::npos;
+        const std::size_t next = findnext(found, said);
         if (next == std::string_view::npos) {
+            if (found.form != nullptr) {
+                memo.keep(head.who, said, found);
+            }
             take(head, found, said, from);
             return;
         }
         ++count.torn;
         text = said.substr(next);
+        readhead(text, head);
     }
+}
+
+// A text that was taken before.
+void logreader::work::takeknown(const linehead& head, const textmemo::known& same,
+                                std::string_view text, std::string_view from)
+{
+    const pattern& form = same.form();
+    if (everything || form.matters || form.goeson) {
+        take(head, same.in(text), text, from);
+        return;
+    }
+    behind = following::kStrange;
+    ++count.messages;
+    moment(head.clock);
 }
 
 // What no head begins.
@@ -365,7 +452,9 @@ void logreader::work::readunlogged(std::string_view text)
     const std::size_t next = findhead(text);
     if (next != std::string_view::npos) {
         ++count.torn;
-        readlogged(text.substr(next), {});
+        linehead head;
+        readhead(text.substr(next), head);
+        readlogged(head, text.substr(next), {});
         return;
     }
     if (behind != following::kStrange && from == writer) {
@@ -406,33 +495,21 @@ bool logreader::work::readhead(std::string_view text, linehead& head)
         return false;
     }
     const std::string_view rest = text.substr(logclock::kDateBytes);
-    const auto& speakers = known.speakers();
-    const auto who = std::find_if(speakers.begin(), speakers.end(), [&](const speaker& voice) {
-        return voice.level != loglevel::kStandardError && rest.starts_with(voice.head);
-    });
-    if (who == speakers.end()) {
+    head.who = known.speakerof(rest);
+    if (head.who == recogniser::kNobody) {
         return false;
     }
-    std::size_t place = who->head.size();
-    const std::size_t digits = place;
-    std::uint64_t thread = 0;
-    for (; place < rest.size() && isdigit(rest[place]); ++place) {
-        const auto digit = static_cast<std::uint64_t>(rest[place] - '0');
-        constexpr std::uint64_t kMost = std::numeric_limits<std::uint64_t>::max();
-        if (thread > (kMost - digit) / 10) {
-            return false;
-        }
-        thread = thread * 10 + digit;
-    }
-    if (place == digits || place == rest.size() || rest[place] != ' ') {
+    const std::size_t before = known.speakers()[head.who].head.size();
+    head.thread = threadin(rest.substr(before));
+    if (head.thread.empty()) {
         return false;
     }
     const auto clocktime = clock.read(text.data());
     if (!clocktime) {
         return false;
     }
-    head = {*clocktime, static_cast<speakerid>(who - speakers.begin()), thread,
-            logclock::kDateBytes + place + 1};
+    head.clock = *clocktime;
+    head.bytes = logclock::kDateBytes + before + head.thread.size() + 1;
     return true;
 }
 
@@ -454,16 +531,20 @@ std::size_t logreader::work::findhead(std::string_view text)
     return std::string_view::npos;
 }
 
-// Whether a message only seems to be one: a text of the configuration in it holds another's head.
-// What commands have printed may hold anything.
-bool logreader::work::istorn(const recogniser::found& found, std::string_view text)
+// Where the next line begins within a text that was cut off: one that is no message, or one with a
+// line's head in a text of the configuration. What commands have printed may hold anything.
+std::size_t logreader::work::findnext(const recogniser::found& found, std::string_view text)
 {
     if (text.find(kThreadMark) == std::string_view::npos) {
-        return false;
+        return std::string_view::npos;
     }
-    const auto& configured = found.form->isconfigured;
-    return (configured[0] && findhead(found.what.first) != std::string_view::npos) ||
-           (configured[1] && findhead(found.what.second) != std::string_view::npos);
+    const auto hashead = [&](std::string_view value) {
+        return findhead(value) != std::string_view::npos;
+    };
+    const bool istorn = found.form == nullptr ||
+                        (found.form->isconfigured[0] && hashead(found.what.first)) ||
+                        (found.form->isconfigured[1] && hashead(found.what.second));
+    return istorn ? findhead(text) : std::string_view::npos;
 }
 
 void logreader::work::take(const linehead& head, const recogniser::found& found,
@@ -485,21 +566,22 @@ void logreader::work::take(const linehead& head, const recogniser::found& found,
         return;
     }
     ++count.messages;
-    message said{.id = found.what.id,
-                 .level = known.speakers()[head.who].level,
-                 .thread = head.thread,
-                 .when = head.who == standarderror ? count.last : moment(head.clock),
-                 .first = found.what.first,
-                 .second = found.what.second,
-                 .text = text,
-                 .line = line};
+    const instant when = head.who == standarderror ? count.last : moment(head.clock);
     if (found.form->goeson) {
         behind = following::kGoesOn;
         writer.assign(from);
     }
-    if (!everything && !matters(said.id)) {
+    if (!everything && !found.form->matters) {
         return;
     }
+    message said{.id = found.what.id,
+                 .level = known.speakers()[head.who].level,
+                 .thread = numberof(head.thread),
+                 .when = when,
+                 .first = found.what.first,
+                 .second = found.what.second,
+                 .text = text,
+                 .line = line};
     if (!found.form->goeson) {
         tell(said);
         return;
@@ -515,7 +597,7 @@ void logreader::work::holdunwhole(const linehead& head, std::string_view text,
     writer.assign(from);
     isheld = true;
     held = {.who = head.who, .clock = head.clock, .text = std::string(text)};
-    held.said.thread = head.thread;
+    held.said.thread = numberof(head.thread);
     held.said.level = known.speakers()[head.who].level;
     held.said.line = line;
 }

@@ -59,7 +59,7 @@ std::string_view takevalue(std::string_view& text)
 pattern takeapart(const messageform& form, speakerid who)
 {
     const bool listing = form.id == messageid::kListing;
-    pattern made{.id = form.id, .who = who};
+    pattern made{.id = form.id, .who = who, .matters = matters(form.id)};
     std::string_view rest = form.text;
     made.literals[0] = takeliteral(rest);
     std::string_view last;
@@ -213,13 +213,7 @@ recogniser::recogniser(std::span<const messageform> forms)
 {
     for (const messageform& form : forms) {
         if (speakerof(form.level, form.module) == kNobody) {
-            voices.push_back({form.level, form.module,
-                              std::string(" ")
-                                  .append(levelword(form.level))
-                                  .append(" ")
-                                  .append(form.module)
-                                  .append("|TID")});
-            starts.emplace_back().first.fill(kNone);
+            addspeaker(form);
         }
         patterns.push_back(takeapart(form, speakerof(form.level, form.module)));
     }
@@ -227,6 +221,21 @@ recogniser::recogniser(std::span<const messageform> forms)
     for (std::size_t index = patterns.size(); index > 0; --index) {
         enlist(index - 1);
     }
+}
+
+void recogniser::addspeaker(const messageform& form)
+{
+    speaker& added = voices.emplace_back(speaker{form.level, form.module});
+    if (form.level == loglevel::kStandardError) {
+        keys.push_back({.third = 1}); // no text's: there that word is the first one, which is 0
+    } else {
+        added.head.append(" ").append(levelword(form.level)).append(" ").append(form.module);
+        added.head.append("|TID");
+        assert(added.head.size() >= speaker::kLeastHeadBytes &&
+               added.head.size() <= speaker::kMostHeadBytes);
+        keys.push_back(keyof(added.head));
+    }
+    starts.emplace_back().first.fill(kNone);
 }
 
 void recogniser::enlist(std::size_t index)
@@ -237,6 +246,23 @@ void recogniser::enlist(std::size_t index)
         begins.empty() ? mine.anything : mine.first.at(static_cast<unsigned char>(begins.front()));
     next[index] = chain;
     chain = static_cast<std::uint8_t>(index);
+}
+
+recogniser::headkey recogniser::keyof(std::string_view head) noexcept
+{
+    const std::size_t tail = head.size() - 2 * kWordBytes;
+    return {wordat(head.data()), wordat(head.data() + kWordBytes), wordat(head.data() + tail),
+            wordat(head.data() + tail + kWordBytes), tail};
+}
+
+speakerid recogniser::searchspeaker(std::string_view text) const noexcept
+{
+    for (std::size_t who = 0; who < voices.size(); ++who) {
+        if (!voices[who].head.empty() && text.starts_with(voices[who].head)) {
+            return static_cast<speakerid>(who);
+        }
+    }
+    return kNobody;
 }
 
 speakerid recogniser::speakerof(loglevel level, std::string_view module) const noexcept

@@ -11,15 +11,19 @@
 #include <string_view>
 #include <vector>
 
+#include "bytes.h"
 #include "message.h"
 
 namespace report {
 
 // A level and a module that messages come from.
 struct speaker {
+    static constexpr std::size_t kLeastHeadBytes = 16; // of those that write to the log
+    static constexpr std::size_t kMostHeadBytes = 32;
+
     loglevel level = loglevel::kStandardError;
     std::string_view module;
-    std::string head; // what stands between the date and the thread: " ERROR wdmanager|TID"
+    std::string head{}; // what stands between the date and the thread: " ERROR wdmanager|TID"
 };
 
 using speakerid = std::uint8_t; // an index
@@ -30,6 +34,7 @@ struct pattern {
 
     messageid id = messageid::kForeign;
     speakerid who = 0;
+    bool matters = false; // as matters() says
     std::array<std::string_view, kMostValues + 1> literals{};
     std::array<bool, kMostValues> isnumber{};
     std::array<bool, kMostValues> isconfigured{}; // text of the configuration: may hold anything
@@ -56,6 +61,25 @@ public:
     // All that write to the log; their indices are their ids.
     [[nodiscard]] const std::vector<speaker>& speakers() const noexcept { return voices; }
 
+    // Whose head `text` begins with; kNobody where it is nobody's.
+    [[nodiscard]] speakerid speakerof(std::string_view text) const noexcept
+    {
+        if (text.size() < speaker::kMostHeadBytes) {
+            return searchspeaker(text);
+        }
+        const std::uint64_t first = wordat(text.data());
+        const std::uint64_t second = wordat(text.data() + kWordBytes);
+        for (std::size_t who = 0; who < keys.size(); ++who) {
+            const headkey& key = keys[who];
+            const char* const tail = text.data() + key.tailat;
+            if (((first ^ key.first) | (second ^ key.second) | (wordat(tail) ^ key.third) |
+                 (wordat(tail + kWordBytes) ^ key.fourth)) == 0) {
+                return static_cast<speakerid>(who);
+            }
+        }
+        return kNobody;
+    }
+
     // kNobody where no message comes from these.
     [[nodiscard]] speakerid speakerof(loglevel level, std::string_view module) const noexcept;
 
@@ -81,11 +105,24 @@ private:
         std::uint8_t anything = kNone; // those that begin with a value
     };
 
+    // A head as its first two and its last two words, which overlap.
+    struct headkey {
+        std::uint64_t first = 0;
+        std::uint64_t second = 0;
+        std::uint64_t third = 0;
+        std::uint64_t fourth = 0;
+        std::size_t tailat = 0; // where these are
+    };
+    static headkey keyof(std::string_view head) noexcept;
+    [[nodiscard]] speakerid searchspeaker(std::string_view text) const noexcept;
+
     std::vector<speaker> voices;
+    std::vector<headkey> keys; // of the speakers; standard error's is that of no line
     std::vector<pattern> patterns;
     std::vector<std::uint8_t> next; // the pattern to try behind each
     std::vector<chains> starts;     // of each speaker
 
+    void addspeaker(const messageform& form);
     void enlist(std::size_t index);
     [[nodiscard]] found findin(std::size_t chain, std::string_view text) const noexcept;
 };
