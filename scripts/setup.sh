@@ -19,11 +19,19 @@ as_root() {
     fi
 }
 
-# The packages of these groups of packages.txt that are not installed.
+# The packages of these groups of packages.txt that are not installed, but for those whose command
+# is there all the same.
 missing_packages() {
-    local group package status
+    local group package command status
     while read -r group package _; do
         case " $* " in *" $group "*) ;; *) continue ;; esac
+        case $package in
+        */*)
+            command=${package#*/}
+            package=${package%/*}
+            ! command -v "$command" >/dev/null || continue
+            ;;
+        esac
         status=$(dpkg-query -W -f='${db:Status-Status}' "$package" 2>/dev/null || true)
         [ "$status" = installed ] || printf '%s\n' "$package"
     done <"$root/scripts/packages.txt"
