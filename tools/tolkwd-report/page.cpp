@@ -130,6 +130,18 @@ json statewords()
     return words;
 }
 
+// Those of them in which somebody should look.
+json troublewords()
+{
+    json words = json::array();
+    for (std::size_t which = 0; which < kStates; ++which) {
+        if (istrouble(static_cast<state>(which))) {
+            words.push_back(wordof(static_cast<state>(which)));
+        }
+    }
+    return words;
+}
+
 json kindwords()
 {
     json words = json::array();
@@ -167,10 +179,23 @@ void writejson(std::ostream& out, const json& value)
     out << text;
 }
 
-// One after the other: a page's data may be large.
-template <typename Items, typename Toliteral>
-void writearray(std::ostream& out, const Items& items, Toliteral tojson)
+// Begins the next member of the data.
+void writename(std::ostream& out, std::string_view name)
 {
+    out << ",\n\"" << name << "\":";
+}
+
+void writemember(std::ostream& out, std::string_view name, const json& value)
+{
+    writename(out, name);
+    writejson(out, value);
+}
+
+// One element after the other: a page's data may be large.
+template <typename Items, typename Tojson>
+void writearray(std::ostream& out, std::string_view name, const Items& items, Tojson tojson)
+{
+    writename(out, name);
     std::string_view separator = "[\n";
     for (const auto& item : items) {
         out << separator;
@@ -186,18 +211,17 @@ void writepage(std::ostream& out, const pagecontents& contents)
 {
     const instant first = beginning(contents);
     const timebase base(first);
-    out << pagebeforedata() << "{\"version\":1,\"clock\":" << first.clock << ",\"log\":";
-    writejson(out, logjson(contents, base));
-    out << ",\n\"states\":";
-    writejson(out, statewords());
-    out << ",\n\"kinds\":";
-    writejson(out, kindwords());
-    out << ",\n\"services\":";
-    writearray(out, contents.services,
+    out << pagebeforedata() << R"({"version":1)";
+    writemember(out, "clock", first.clock);
+    writemember(out, "loadfailed", contents.loadfailed);
+    writemember(out, "log", logjson(contents, base));
+    writemember(out, "states", statewords());
+    writemember(out, "troubles", troublewords());
+    writemember(out, "kinds", kindwords());
+    writearray(out, "services", contents.services,
                [&](const pageservice& service) { return servicejson(service, base); });
     // With the service's place in front.
-    out << ",\n\"marks\":";
-    writearray(out, contents.marks, [&](const pagemark& mark) {
+    writearray(out, "marks", contents.marks, [&](const pagemark& mark) {
         return json{mark.service, markjson(mark, base)};
     });
     out << "}\n" << pageafterdata();

@@ -29,6 +29,7 @@ struct pagecontents {
     std::vector<std::string> files; // the logs' names, as they were given
     readcount count;
     std::vector<pageservice> services;
+    bool loadfailed = false;     // the last load of the configuration, so that nothing is watched
     std::vector<pagemark> marks; // recoveries, give-ups and the like, in order
 };
 

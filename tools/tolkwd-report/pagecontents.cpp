@@ -48,6 +48,7 @@ public:
         pagecontents result;
         result.files = std::move(seen.files);
         result.count = seen.count;
+        result.loadfailed = seen.loadfailed;
         for (std::size_t i = 0; i < spans.size(); ++i) {
             result.services.push_back({std::move(seen.services[i]), std::move(spans[i])});
         }

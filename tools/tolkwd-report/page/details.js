@@ -32,15 +32,21 @@ function marksof(item, extent) {
 
 function markline(mark) {
     const line = element('li');
-    line.append(signpicture(kSigns[signof(mark.kind)]),
+    line.append(signpicture(kSigns[signof(mark)]),
         element('time', '', clocktext(mark.clock)),
         element('span', '', mark.words + (mark.inferred ? ' (inferred)' : '')));
     return line;
 }
 
+// Those that matter most, in the order in which they happened.
+function mainmarks(marks) {
+    const graver = [...marks].sort((a, b) => signof(b) - signof(a) || a.at - b.at);
+    return graver.slice(0, kMarksTold).sort((a, b) => a.at - b.at);
+}
+
 function marklist(marks) {
     const list = element('ul', 'marks');
-    list.append(...marks.slice(0, kMarksTold).map(markline));
+    list.append(...mainmarks(marks).map(markline));
     if (marks.length > kMarksTold) {
         list.append(element('li', 'more', `and ${counttext(marks.length - kMarksTold)} more`));
     }
@@ -64,7 +70,9 @@ class Details {
         this.clear();
     }
 
-    show(item) {
+    // `pointed`: by a pointer on its way, for which the panel is no obstacle.
+    show(item, pointed) {
+        this.target.classList.toggle('pointed', pointed);
         const key = item.key + '/' + item.service.id;
         if (this.shown === key) {
             return;
@@ -86,6 +94,7 @@ class Details {
         this.target.replaceChildren(
             element('p', 'means', 'Point at a time line, tap it, or go there with the keys: what is ' +
                 'known of that state is told here.'));
+        this.target.classList.remove('pointed');
         this.target.classList.add('idle');
     }
 }

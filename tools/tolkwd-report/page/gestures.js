@@ -125,7 +125,7 @@ function listentopointing(timelines, fingers) {
         if (event.pointerType === 'mouse' && fingers.down.size === 0) {
             const item = pointed(event, kMouseReach);
             if (item) {
-                details.show(item);
+                details.show(item, true);
             } else {
                 timelines.rest();
             }
@@ -140,7 +140,11 @@ function listentopointing(timelines, fingers) {
         }
     });
     // What a click focuses is what it chooses.
-    lines.addEventListener('mousedown', (event) => event.preventDefault());
+    lines.addEventListener('mousedown', (event) => {
+        if (ontrack(event)) {
+            event.preventDefault();
+        }
+    });
 }
 
 // Of several spans drawn as one, the worst.

@@ -10,11 +10,8 @@ function byid(id) {
     return document.getElementById(id);
 }
 
-function headline(services) {
-    // The states in the order of their gravity: from this one on somebody should look.
-    const words = Object.keys(kLooks);
-    const least = words.indexOf('command-not-recognised');
-    const trouble = services.filter(({now}) => words.indexOf(now.word) >= least).length;
+function headline(services, troubles) {
+    const trouble = services.filter(({now}) => troubles.includes(now.word)).length;
     const all = counted(services.length, 'service', 'services');
     if (services.length === 0) {
         return 'No services';
@@ -23,15 +20,17 @@ function headline(services) {
         `${counttext(trouble)} of ${all} in trouble`;
 }
 
-function writehead({services, log, clock, extent}) {
-    byid('headline').textContent = headline(services);
+function writehead({services, troubles, log, clock, extent, loadfailed}) {
+    byid('headline').textContent = headline(services, troubles);
     const dated = log.from !== null || services.length > 0;
     const [from, to] = log.from === null ? [extent.from, extent.to] : [log.from[0], log.to[0]];
     const end = Math.max(to, services.length > 0 ? d3.max(services, ({now}) => now.to) : to);
     byid('period').textContent = !dated ? 'The log tells no time.' : from === end ?
         `at ${clocktext(clock.at(from))}` :
         `${clocktext(clock.at(from))} to ${clocktext(clock.at(end))}, ${spantext(end - from)}`;
-    byid('source').textContent = log.files.length > 0 ? `from ${log.files.join(', ')}` : '';
+    const files = log.files.map((file) => (file === '-' ? 'standard input' : file));
+    byid('source').textContent = files.length > 0 ? `from ${files.join(', ')}` : '';
+    byid('failed').hidden = !loadfailed;
 }
 
 function writecounts({log}) {
@@ -52,7 +51,7 @@ function writerange(view, clock) {
         `${clocktext(clock.at(view.from))} to ${clocktext(clock.at(view.to))}, ` +
             spantext(view.length);
     for (const id of ['out', 'all', 'back', 'forth']) {
-        byid(id).disabled = view.whole;
+        byid(id).setAttribute('aria-disabled', String(view.whole));
     }
 }
 

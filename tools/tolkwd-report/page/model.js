@@ -31,6 +31,7 @@ function readservice(data, id, {states, clock: beginning}) {
     return {
         ...data,
         id,
+        name: data.name || '(no name)',
         folded: data.name.toLowerCase(),
         now: read(data.now),
         lastoutage: readoutage(data.lastoutage, beginning),
@@ -73,7 +74,9 @@ function readmodel(data) {
     }
     return {
         log: data.log,
+        loadfailed: data.loadfailed,
         states: data.states,
+        troubles: data.troubles,
         services,
         clock: new Clock(data.clock, moments),
         extent: extentof(moments),

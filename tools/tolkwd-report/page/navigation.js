@@ -71,13 +71,19 @@ function actionof(event, timelines) {
     }
     const arrow = event.key.startsWith('Arrow');
     const key = event.shiftKey && arrow ? `Shift+${event.key}` : event.key;
-    return kEverywhere[key] ?? (timelines.active ? kAtChosen[key] : undefined);
+    return kEverywhere[key] ?? (timelines.active ? kAtChosen[key] : arrow ? enter : undefined);
 }
 
 function listentokeys(timelines) {
     const {lines} = timelines;
     lines.tabIndex = 0;
-    lines.addEventListener('focus', () => enter(timelines));
+    lines.addEventListener('focus', (event) => {
+        // A click beside the lines, and leaving what was chosen, are no way in.
+        const inside = lines.contains(event.relatedTarget);
+        if (!inside && lines.matches(':focus-visible')) {
+            enter(timelines);
+        }
+    });
     lines.addEventListener('keydown', (event) => {
         const action = actionof(event, timelines);
         if (action) {

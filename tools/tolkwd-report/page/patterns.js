@@ -17,22 +17,24 @@ const kLooks = {
     'recovering': {means: 'stopped and started because of its status', lines: 'M0,2h8M0,6h8'},
     'functional-recovering': {means: 'stopped and started because of its check',
                               lines: 'M0,6l4,-4l4,4'},
-    'unknown-service': {means: 'its status command does not know it; nothing watches it any more',
+    'unknown-service': {means: 'its status command does not know it; no longer watched',
                         lines: 'M0,4h8M4,0v8'},
-    'gave-up': {means: 'recovered in vain; nothing watches it any more', lines: 'M1,1l6,6M7,1l-6,6'},
+    'gave-up': {means: 'recovered in vain; no longer watched', lines: 'M1,1l6,6M7,1l-6,6'},
 };
 
 const kGuessMeans = 'inferred: no message of the log says that it began, or when';
 
 // Signs of 8 by 8 around their middle, the gravest last: where several meet it is the one shown.
+// The other kinds of marks show as the beginning of a state, if at all, and are told in words only.
 const kSigns = [
-    {name: 'other', means: 'another event', path: 'M0,-3l3,3l-3,3l-3,-3z'},
+    {name: 'other', path: 'M-1.5,0a1.5,1.5 0 1,0 3,0a1.5,1.5 0 1,0 -3,0z'},
     {name: 'recovered', means: 'recovered', path: 'M-3.5,0a3.5,3.5 0 1,0 7,0a3.5,3.5 0 1,0 -7,0z'},
     {name: 'recovery-tried', means: 'recovery tried', path: 'M0,-4l4,7.5h-8z'},
     {name: 'gave-up', means: 'given up', path: 'M-3.5,-3.5l7,7M3.5,-3.5l-7,7', line: true},
 ];
 
-function signof(kind) {
+// Its place among them.
+function signof({kind}) {
     return Math.max(0, kSigns.findIndex(({name}) => name === kind));
 }
 
@@ -98,11 +100,21 @@ function stateword(word, inferred) {
     return shown;
 }
 
+const kChangesTold = 3;
+
+function changesinwords(clock, {from, to}) {
+    const changes = clock.changed(from, to);
+    const told = changes.slice(0, kChangesTold).map(({place, by}) =>
+        `${by > 0 ? 'forward' : 'back'} ${spantext(Math.abs(by))}, to ${clocktext(clock.at(place))}`);
+    const more = changes.length > told.length ? '; and more' : '';
+    return `the clock of the log was set ${told.join('; ')}${more}`;
+}
+
 // What is in the time lines, and no more.
 function drawlegend(target, {services, clock, extent}) {
     const spans = services.flatMap((service) => service.spans);
     const words = new Set(spans.map((span) => span.word));
-    const signs = new Set(services.flatMap((service) => service.marks).map((one) => signof(one.kind)));
+    const signs = new Set(services.flatMap((service) => service.marks).map(signof));
     const list = element('ul');
     const add = (picture, term, means) => {
         const item = element('li');
@@ -114,10 +126,10 @@ function drawlegend(target, {services, clock, extent}) {
     if (spans.some((span) => span.inferred)) {
         add(swatch('up', true), '~ lighter, hatched', kGuessMeans);
     }
-    kSigns.filter((sign, i) => signs.has(i))
+    kSigns.filter((sign, i) => i > 0 && signs.has(i))
         .forEach((sign) => add(signpicture(sign), sign.means, ''));
     if (clock.changed(extent.from, extent.to).length > 0) {
-        add(element('span', 'seam'), 'dashed', 'the clock was set');
+        add(element('span', 'seam'), 'dashed', changesinwords(clock, extent));
     }
     target.replaceChildren(list);
 }

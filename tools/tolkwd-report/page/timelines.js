@@ -12,8 +12,10 @@ const kMarkPixels = 8;
 const kBarTop = 10;
 const kMarkMiddle = 5;
 const kLabelHeight = 15;
+const kCalmShare = 0.45;   // how thin a line of the calm state is: trouble stands out without colour
 
-// What a row draws: items from left to right, the narrow ones last, so that none is hidden.
+// What a row draws: items from left to right, the narrow ones last, so that none is hidden. The
+// active span is always among them, beyond the edge if need be: it holds the keyboard.
 function itemsof(service, view, scale, width, active) {
     const {spans} = service;
     const wide = [];
@@ -56,6 +58,11 @@ function itemsof(service, view, scale, width, active) {
         }
     }
     finish();
+    const isactive = ({first, last}) => first === active && last === active;
+    if (active >= 0 && !narrow.some(isactive)) {
+        const x = pixels(spans[active].from);
+        narrow.push(make(active, active, x, x + kTroublePixels, active));
+    }
     return [...wide, ...narrow];
 }
 
@@ -65,9 +72,9 @@ function signsof(service, view, scale) {
     const first = places.left(service.marks, view.from);
     const last = places.right(service.marks, view.to);
     const shown = [];
-    for (const mark of service.marks.slice(first, last)) {
+    for (const mark of service.marks.slice(first, last).filter((one) => signof(one) > 0)) {
         const x = scale(mark.at);
-        const sign = signof(mark.kind);
+        const sign = signof(mark);
         const before = shown[shown.length - 1];
         if (before && x - before.x < kMarkPixels) {
             before.sign = Math.max(before.sign, sign);
@@ -88,6 +95,12 @@ function labelof({key, word, inferred, x, width}, seen) {
     return {key, text, length, x: (begin + end) / 2, fits: word !== 'up' && end - begin > length + 8};
 }
 
+// How high an item stands in its row.
+function extentdown({word}, height) {
+    const share = word === 'up' ? kCalmShare : 1;
+    return {top: kBarTop + (height * (1 - share)) / 2, height: height * share};
+}
+
 class Timelines {
     constructor({lines, axis, model, view, details}) {
         Object.assign(this, {lines, axis, model, view, details});
@@ -104,6 +117,7 @@ class Timelines {
         this.services = services;
         if (this.active && !services.includes(this.active.service)) {
             this.active = null;
+            this.lines.tabIndex = 0;
             this.details.clear();
         }
         this.refresh();
@@ -197,21 +211,23 @@ class Timelines {
     }
 
     drawspans(layer, items, chosen) {
+        const ischosen = (item) => single(item) && item.first === chosen;
         layer.selectAll('rect').data(items, ({key}) => key)
             .join((enter) => enter.append('rect')
                 .attr('role', 'img')
                 .attr('tabindex', -1)
-                .attr('aria-label', iteminwords)
-                .attr('y', kBarTop))
-            .attr('height', this.barheight)
+                .attr('aria-label', iteminwords))
+            .attr('y', (item) => extentdown(item, this.barheight).top)
+            .attr('height', (item) => extentdown(item, this.barheight).height)
             .attr('x', ({x}) => x)
             .attr('width', (item) => item.width)
             .attr('class', ({word}) => `span ${word}`)
             .attr('fill', (item) => (item.width < kTexturePixels ? null :
                 lookof(item.word, item.inferred)))
             .classed('plain', (item) => item.width < kTexturePixels)
-            .classed('chosen', (item) => single(item) && item.first === chosen)
-            .attr('tabindex', (item) => (single(item) && item.first === chosen ? 0 : -1))
+            .classed('chosen', ischosen)
+            .attr('tabindex', (item) => (ischosen(item) ? 0 : -1))
+            .attr('aria-describedby', (item) => (ischosen(item) ? this.details.target.id : null))
             .order();
     }
 
@@ -255,24 +271,22 @@ class Timelines {
         this.view.reveal(span.from, span.to);
         this.edition += 1;
         this.lines.tabIndex = -1;
+        this.details.show(this.chosenitem(), false);
         this.scrolltorow(this.services.indexOf(service));
         this.draw();
-        this.details.show(this.chosenitem());
         if (focus) {
             this.lines.querySelector('.chosen')?.focus({preventScroll: true});
         }
     }
 
+    // The keyboard stays on the lines as a whole.
     unchoose() {
-        const focused = this.lines.contains(document.activeElement);
         this.active = null;
         this.lines.tabIndex = 0;
         this.details.clear();
+        this.lines.focus({preventScroll: true});
         this.edition += 1;
         this.draw();
-        if (focused) {
-            document.activeElement.blur();
-        }
     }
 
     chosenitem() {
@@ -284,7 +298,7 @@ class Timelines {
     // What is told while nothing is pointed at.
     rest() {
         if (this.active) {
-            this.details.show(this.chosenitem());
+            this.details.show(this.chosenitem(), false);
         } else {
             this.details.clear();
         }
