@@ -6,9 +6,10 @@ import sys
 import pytest
 
 HERE = pathlib.Path(__file__).resolve().parent
-sys.path.insert(0, str(HERE.parents[1] / "system"))
+TESTS = HERE.parents[1]
+sys.path[:0] = [str(TESTS / "system"), str(TESTS / "support" / "stepclock")]
 
-import outages  # noqa: E402 -- needs the path
+import outages  # noqa: E402 -- needs the paths
 
 
 def pytest_addoption(parser):
