@@ -6,6 +6,7 @@
 // What a command does takes no time on this clock. STEPCLOCK_LASTING gives some a length of their
 // own, in the daemon's seconds: "TEXT=SECONDS;TEXT=SECONDS" for commands that hold the text. Each
 // command is written to the file STEPCLOCK_JOURNAL, with the times at which it began and ended.
+// STEPCLOCK_LATER puts the clock's beginning off by so many seconds.
 //
 // Does for a daemon whose threads wait for nothing but pauses, commands and each other's ends. A
 // thread that waits for a lock counts as one that has something to do, so no command may last on
@@ -32,6 +33,18 @@ template <typename Function>
 Function* next(const char* name)
 {
     return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
+}
+
+std::string environment(const char* name)
+{
+    const char* const value = std::getenv(name);
+    return value == nullptr ? "" : value;
+}
+
+std::time_t begintime()
+{
+    const std::string later = environment("STEPCLOCK_LATER");
+    return kBegin + (later.empty() ? 0 : std::stol(later));
 }
 
 class stepclock {
@@ -87,7 +100,7 @@ private:
 
     std::mutex turn;
     std::condition_variable moved;
-    std::time_t time = kBegin;
+    std::time_t time = begintime();
     std::multiset<std::time_t> ends; // of the pauses under way
     int busy = 1;                    // the main thread
 };
@@ -124,12 +137,6 @@ unsigned lastingof(const std::string& command, std::string table)
         }
     }
     return 0;
-}
-
-std::string environment(const char* name)
-{
-    const char* const value = std::getenv(name);
-    return value == nullptr ? "" : value;
 }
 
 void note(std::time_t begin, const char* command)

@@ -7,7 +7,8 @@ import pathlib
 import subprocess
 import threading
 
-SANDBOX = pathlib.Path(__file__).resolve().parents[3] / "scripts" / "sandbox.sh"
+HERE = pathlib.Path(__file__).resolve().parent
+SANDBOX = HERE.parents[2] / "scripts" / "sandbox.sh"
 
 # The clock skips all pauses, so even an outage of hours is over in a few seconds.
 LIMIT_SECONDS = 60
@@ -25,7 +26,8 @@ class Command:
 @dataclasses.dataclass
 class Daemon:
     """A daemon to be run. `machine` is a folder of programs whose enter.sh sets up the machine and
-    becomes the daemon. It finds them in /opt, and there `results`, a folder that stays."""
+    goes on as /opt/become.sh. `results` is a folder that stays, /opt/results inside: it has the
+    configuration, and gets the log."""
 
     tolkwd: pathlib.Path
     clock: pathlib.Path
@@ -40,8 +42,8 @@ class Daemon:
         zone = {"TZ": os.environ["TZ"]} if "TZ" in os.environ else {}
         for name, value in dict(environment, **zone).items():
             command += ["--setenv", name, value]
-        for source, target in ((self.machine, "/opt/machine"), (self.clock, "/opt/clock.so"),
-                               (self.tolkwd, "/opt/tolkwd/tolkwd")):
+        for source, target in ((self.machine, "/opt/machine"), (HERE / "become.sh", "/opt/become.sh"),
+                               (self.clock, "/opt/clock.so"), (self.tolkwd, "/opt/tolkwd/tolkwd")):
             command += ["--ro-bind", source, target]
         command += ["--bind", self.results, "/opt/results", "--", "/opt/machine/enter.sh",
                     *(str(each) for each in arguments)]

@@ -8,11 +8,6 @@
 # has failed once.
 set -eu
 
-mkdir -p /etc/opt/varden/tolk /opt/varden/tolk/bin
-touch /etc/opt/varden/tolk/cimom /etc/opt/varden/tolk/wd.nxinstalled
 touch /run/runs /run/works
 [ -z "${BUSY-}" ] || touch /run/busy
-echo $$ >/run/daemon.pid
-
-exec env PATH="/opt/machine:$PATH" LD_PRELOAD=/opt/clock.so STEPCLOCK_JOURNAL=/opt/results/journal \
-    /opt/tolkwd/tolkwd -i /opt/results/tolkwd.xml -l /opt/results/tolkwd.log -t "$1" -g
+exec /opt/become.sh -t "$1" -g
