@@ -42,8 +42,9 @@ class Daemon:
         zone = {"TZ": os.environ["TZ"]} if "TZ" in os.environ else {}
         for name, value in dict(environment, **zone).items():
             command += ["--setenv", name, value]
-        for source, target in ((self.machine, "/opt/machine"), (HERE / "become.sh", "/opt/become.sh"),
-                               (self.clock, "/opt/clock.so"), (self.tolkwd, "/opt/tolkwd/tolkwd")):
+        for source, target in ((self.machine, "/opt/machine"), (self.clock, "/opt/clock.so"),
+                               (HERE / "become.sh", "/opt/become.sh"),
+                               (self.tolkwd, "/opt/tolkwd/tolkwd")):
             command += ["--ro-bind", source, target]
         command += ["--bind", self.results, "/opt/results", "--", "/opt/machine/enter.sh",
                     *(str(each) for each in arguments)]
@@ -85,4 +86,5 @@ class Daemon:
             finally:
                 limit.cancel()
                 process.kill()  # the sandbox, which takes with it what is inside
+                process.stdout.read()  # when that has ended, too, and writes no more
         return printed, not late.is_set()
