@@ -3,10 +3,11 @@ place, and no other."""
 
 import json
 import pathlib
-import re
 import subprocess
 
 import pytest
+
+from manual import paths_in, paths_told, section
 
 PROJECT = pathlib.Path(__file__).resolve().parents[2]
 PAGE = (PROJECT / "doc" / "tolkwd-check.8").read_text()
@@ -14,40 +15,6 @@ TIME_LIMIT = 60  # seconds
 
 # The sample has a check and a dependent, so that nothing is null that could be an object.
 SAMPLE = PROJECT / "config" / "tolkwd.xml"
-
-
-def paths_told(section):
-    """The members that a section of the page names, as {"outages.log.begins"}: those of each list
-    belong to the item that it stands in. One list for each that stands in none."""
-    lists = []
-    items = []  # the names of each item that is open
-    for line in section.splitlines():
-        if line.startswith(".Bl "):
-            if not items:
-                lists.append(set())
-            items.append([])
-        elif line.startswith(".El"):
-            items.pop()
-        elif line.startswith(".It Cm "):
-            names = [name.replace("\\", "") for name in line.removeprefix(".It Cm ").split(" , ")]
-            above = items[-2] if len(items) > 1 else [""]
-            items[-1] = [f"{path}{name}." for path in above for name in names]
-            lists[-1] |= {path.rstrip(".") for path in items[-1]}
-    return lists
-
-
-def paths_in(value, time, path=""):
-    """The same of what the program has written. A time has no members of its own here."""
-    if isinstance(value, list):
-        return set().union(*(paths_in(each, time, path) for each in value))
-    if not isinstance(value, dict) or value.keys() == time:
-        return {path.rstrip(".")} - {""}
-    inside = (paths_in(each, time, f"{path}{name}.") for name, each in value.items())
-    return set().union({path.rstrip(".")} - {""}, *inside)
-
-
-def section(title):
-    return re.split(r"^\.S[hs] ", PAGE.split(f".Ss {title}\n")[1], maxsplit=1, flags=re.M)[0]
 
 
 @pytest.fixture(scope="module")
@@ -63,18 +30,18 @@ def written(program):
 
 
 def test_the_page_tells_every_member_of_the_plan(written):
-    time, members = paths_told(section("The plan"))
+    time, members = paths_told(section(PAGE, "The plan"))
     assert time == {"seconds", "checks", "recoveries"}
     assert paths_in(written["plan"], time) == members
 
 
 def test_the_page_tells_every_member_of_the_probe(written):
-    members, = paths_told(section("The probe"))
+    members, = paths_told(section(PAGE, "The probe"))
     assert paths_in(written["probe"], {}) == members
 
 
 def test_the_page_tells_every_member_around_them(written):
-    members, = paths_told(PAGE.split(".Sh JSON\n")[1].split(".Ss ")[0])
+    members, = paths_told(section(PAGE, "JSON"))
     assert set(written) == members
 
 
