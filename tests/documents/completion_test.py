@@ -1,28 +1,13 @@
-"""The completion of tolkwd-check for bash, asked as bash asks it."""
+"""The completion of tolkwd-check for bash."""
 
 import os
-import pathlib
 import re
 import subprocess
 
 import pytest
 
+import bash
 import rules
-
-COMPLETION = pathlib.Path(__file__).resolve().parents[2] / "packaging" / "completion.bash"
-
-# Prints what is offered for the last of the words.
-ASK = """
-set -u
-. "$0"
-complete -p tolkwd-check >/dev/null || exit
-COMP_WORDS=("$@")
-COMP_CWORD=$(($# - 1))
-_tolkwd_check
-for offer in "${COMPREPLY[@]}"; do
-    printf '%s\\n' "$offer"
-done
-"""
 
 
 @pytest.fixture
@@ -34,11 +19,8 @@ def offered(program, tmp_path):
     (tmp_path / "old" / "first.xml").touch()
 
     def ask(*words):
-        environment = {"PATH": f"{program.parent}:{os.environ['PATH']}"}
-        done = subprocess.run(["bash", "-c", ASK, COMPLETION, "tolkwd-check", *words], cwd=tmp_path,
-                              env=environment, check=True, capture_output=True, text=True)
-        assert done.stderr == ""
-        return sorted(done.stdout.splitlines())
+        return bash.offered("tolkwd-check", words, tmp_path,
+                            f"{program.parent}:{os.environ['PATH']}")
 
     return ask
 
@@ -77,6 +59,4 @@ def test_nothing_behind_a_number(offered):
 
 
 def test_nothing_where_there_is_no_program(tmp_path):
-    done = subprocess.run(["/bin/bash", "-c", ASK, COMPLETION, "tolkwd-check", "--allow", ""],
-                          cwd=tmp_path, env={"PATH": "/nowhere"}, capture_output=True, text=True)
-    assert (done.returncode, done.stdout, done.stderr) == (0, "", "")
+    assert bash.offered("tolkwd-check", ["--allow", ""], tmp_path, "/nowhere") == []
