@@ -10,7 +10,8 @@ set(CPACK_PACKAGE_DESCRIPTION
 command of the operator's whether it works. A service that keeps failing is
 stopped and started again, together with the services that depend on it, in a
 fixed order. The configuration is read afresh every few hours.
-tolkwd-check tells beforehand what the daemon will make of a configuration.
+tolkwd-check tells beforehand what the daemon will make of a configuration,
+tolkwd-report afterwards what became of each service.
 Nothing is enabled or started before there is a configuration.")
 set(CPACK_PACKAGE_DIRECTORY ${PROJECT_SOURCE_DIR}/build/packages)
 set(CPACK_GENERATOR DEB RPM)
@@ -69,11 +70,12 @@ file(STRINGS ${debian}/conffiles kept)
 list(TRANSFORM kept PREPEND "%config(noreplace) ")
 # Named, or their absolute paths would make configuration files of them, too.
 set(CPACK_RPM_USER_FILELIST ${kept} "%attr(0755,root,root) /opt/varden/tolk/bin/tolkwd"
-  "%attr(0755,root,root) /opt/varden/tolk/bin/tolkwd-check")
+  "%attr(0755,root,root) /opt/varden/tolk/bin/tolkwd-check"
+  "%attr(0755,root,root) /opt/varden/tolk/bin/tolkwd-report")
 # Folders of the system, which are not this package's.
 set(CPACK_RPM_EXCLUDE_FROM_AUTO_FILELIST_ADDITION
   /etc /etc/default /etc/init.d /etc/opt /opt /usr/lib/systemd /usr/lib/systemd/system
-  /usr/sbin /usr/share/bash-completion /usr/share/bash-completion/completions /usr/share/man
-  /usr/share/man/man5 /usr/share/man/man8)
+  /usr/bin /usr/sbin /usr/share/bash-completion /usr/share/bash-completion/completions
+  /usr/share/man /usr/share/man/man1 /usr/share/man/man5 /usr/share/man/man8)
 
 include(CPack)

@@ -1,6 +1,7 @@
 """The packages: what is in them, and what they do to a fresh machine that installs them."""
 
 import glob
+import json
 import os
 import re
 import subprocess
@@ -126,10 +127,12 @@ def test_every_file_has_its_place(packed):
     files = files_of_deb(packed("DEB"))
     assert {"opt/varden/tolk/bin/tolkwd", "usr/sbin/tolkwd", EXAMPLE[1:], DEFAULTS[1:],
             "opt/varden/tolk/bin/tolkwd-check", "usr/sbin/tolkwd-check",
+            "opt/varden/tolk/bin/tolkwd-report", "usr/bin/tolkwd-report",
             "usr/share/bash-completion/completions/tolkwd-check",
+            "usr/share/bash-completion/completions/tolkwd-report",
             "etc/init.d/tolkwd", "usr/lib/systemd/system/tolkwd.service",
             "usr/share/man/man8/tolkwd.8.gz", "usr/share/man/man5/tolkwd.xml.5.gz",
-            "usr/share/man/man8/tolkwd-check.8.gz",
+            "usr/share/man/man8/tolkwd-check.8.gz", "usr/share/man/man1/tolkwd-report.1.gz",
             "usr/share/doc/tolkwd/LICENSE", "usr/share/doc/tolkwd/OPERATING.md",
             "usr/share/doc/tolkwd/MESSAGES.md"} <= files
     assert CONFIGURATION[1:] not in files
@@ -205,10 +208,11 @@ def test_an_installation_by_hand_overwrites_no_edited_file(build, tmp_path):
                        "PATH": "/usr/bin:/bin"}, check=True, stdout=subprocess.DEVNULL)
 
     install()
-    for name in ("tolkwd", "tolkwd-check"):
+    for link in ("usr/sbin/tolkwd", "usr/sbin/tolkwd-check", "usr/bin/tolkwd-report"):
+        name = link.rsplit("/", 1)[1]
         program = tmp_path / "opt/varden/tolk/bin" / name
         assert program.stat().st_mode & 0o111 == 0o111
-        assert (tmp_path / "usr/sbin" / name).readlink().as_posix() == f"{PINGS}/{name}"
+        assert (tmp_path / link).readlink().as_posix() == f"{PINGS}/{name}"
     edited = tmp_path / EXAMPLE[1:]
     edited.write_text("edited")
     install()
@@ -279,6 +283,10 @@ def test_a_killed_service_comes_back(machine, packed):
     machine.await_line(LOG, "this service has been general recoverred successfully.")
     assert cron(machine) != old
     assert "is running" in machine.run("service cron status")
+    # Whoever may read the log is told so.
+    told = machine.run("setpriv --reuid nobody --clear-groups tolkwd-report status --json")
+    (service,) = json.loads(told)["services"]
+    assert (service["service"], service["state"], service["outages"]) == ("cron", "up", 1)
 
 
 @on_a_machine
