@@ -1,20 +1,20 @@
 """The mistakes that doc/OPERATING.md shows: their files are in examples/, and what the guide shows
-of them is what the program says of them.
-
-In that section of the guide, an indented block that begins with "tolkwd-check" is a command and its
-output, folded where it is long; "..." stands for lines left out. One that begins with "<" stands in
-the file of the next command. The rest is prose."""
+of them is what the program says of them."""
 
 import pathlib
 import re
 import subprocess
+import sys
 
 import pytest
 
 HERE = pathlib.Path(__file__).resolve().parent
 PROJECT = HERE.parents[1]
-SECTION = "## 13. Checking a configuration before it is used\n"
-LEFT_OUT = "..."
+sys.path.insert(0, str(PROJECT / "tests" / "support"))
+
+import guide  # noqa: E402 -- needs the path
+
+EXAMPLES = guide.examples("13. Checking a configuration before it is used", "tolkwd-check")
 TIME_LIMIT = 60  # seconds
 
 # Of a machine on which cron runs. The folder's files belong to root there.
@@ -25,41 +25,6 @@ cp -R --no-preserve=mode,ownership /run/examples /opt/examples && cd /opt/exampl
 PATH=$PATH:/run/program
 exec "$@"
 """
-
-
-def blocks():
-    """The indented blocks of the section, each as its lines; an output's empty line is kept."""
-    section = (PROJECT / "doc" / "OPERATING.md").read_text(encoding="utf-8").split(SECTION)[1]
-    section = section.split("\n## ")[0]
-    found = []
-    for paragraph in section.split("\n\n"):
-        lines = paragraph.strip("\n").split("\n")
-        if not all(line.startswith("    ") for line in lines):
-            continue
-        lines = [line[4:] for line in lines]
-        if lines[0].startswith(("<", "tolkwd-check ")):
-            found.append(lines)
-        else:
-            found[-1] += ["", *lines]
-    return found
-
-
-def examples():
-    """(arguments, lines of the file that are shown, output that is shown) of each command."""
-    found = []
-    excerpt = []
-    for lines in blocks():
-        if lines[0].startswith("<"):
-            excerpt = lines
-        else:
-            found.append((lines[0].split()[1:], excerpt, lines[1:]))
-            excerpt = []
-    return found
-
-
-def unfolded(text):
-    """On one line. Blanks inside a line stay: the mark has to stand below its place."""
-    return re.sub(r"\s*\n\s*", " ", text.strip())
 
 
 def without_figures(text):
@@ -80,25 +45,7 @@ def output_of(program, arguments):
     return result.stdout
 
 
-def pieces_of(shown):
-    """The runs of lines between those left out."""
-    return [piece.strip("\n") for piece in re.split(rf"^{re.escape(LEFT_OUT)}$", "\n".join(shown),
-                                                    flags=re.M)]
-
-
-def assert_shown(shown, output):
-    """Each piece of what is shown follows the one before it in the output; where nothing is said
-    to be left out, nothing is."""
-    pieces = [unfolded(without_figures(piece)) for piece in pieces_of(shown)]
-    said = unfolded(without_figures(output))
-    if len(pieces) == 1:
-        assert pieces[0] == said
-    for piece in pieces:
-        assert piece in said
-        said = said.split(piece, 1)[1] if piece else said
-
-
-@pytest.mark.parametrize("arguments, excerpt, shown", examples(),
+@pytest.mark.parametrize("arguments, excerpt, shown", EXAMPLES,
                          ids=lambda value: " ".join(value[:3]) if value else "-")
 def test_the_guide_shows_what_is_said(program, arguments, excerpt, shown):
     if excerpt:
@@ -106,11 +53,11 @@ def test_the_guide_shows_what_is_said(program, arguments, excerpt, shown):
         assert "\n".join(excerpt) in re.sub(r"^ +", "", text, flags=re.M)
     output = output_of(program, arguments)
     assert output
-    assert_shown(shown, output)
+    guide.assert_shown(shown, output, without_figures)
 
 
 def test_the_guide_shows_each_file():
-    shown = {arguments[-1] for arguments, _, _ in examples()}
+    shown = {arguments[-1] for arguments, _, _ in EXAMPLES}
     assert shown == {file.name for file in (HERE / "examples").iterdir()}
 
 
@@ -129,7 +76,7 @@ def test_an_answer_by_exit_status_is_found_by_a_trial_only(program):
 ])
 def test_a_difference_is_noticed(shown, output, same):
     if same:
-        assert_shown(shown, output)
+        guide.assert_shown(shown, output, without_figures)
     else:
         with pytest.raises(AssertionError):
-            assert_shown(shown, output)
+            guide.assert_shown(shown, output, without_figures)
