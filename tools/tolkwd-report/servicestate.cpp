@@ -1,5 +1,7 @@
 #include "servicestate.h"
 
+#include <utility>
+
 #include "wdmonitorthread_linux.h"
 
 namespace report {
@@ -374,7 +376,9 @@ void servicestate::settlesilence(const instant& when, bool steps, turns& told)
 // What is now has never begun: what was before goes on, at least until `when`.
 void servicestate::refute(const instant& when, turns& told)
 {
-    if (!told.begun.empty()) {
+    if (told.begun.empty()) {
+        retold = true;
+    } else {
         told.begun.pop_back();
     }
     open = doubt::kNone;
@@ -397,7 +401,11 @@ void servicestate::begin(const beginning& next, turns& told)
         refute(begun.when, told); // it would be an empty span
     }
     open = doubt::kNone;
+    const bool again = std::exchange(retold, false);
     if (known && now.what == begun.what) {
+        if (again) {
+            told.begun.push_back(begun);
+        }
         return;
     }
     if (held) {
