@@ -314,6 +314,16 @@ STORIES = {
         {"web status": well * 2 + down * 2 + end + well * 5},
         {"web": [BEGIN, Span(DOWN, "web status 3", False), Span(UP, "web status 5")]},
         later=(0, 200)),
+
+    "the daemon is killed in an outage that lasts": Story(
+        (WEB, BEAT),
+        {"web status": well * 2 + down * 2 + end + down * 4 + well * 40},
+        {"web": [BEGIN, Span(DOWN, "web status 3", False), Span(RECOVERY, "web start 1"),
+                 Span(UP, "web status 9")]},
+        {"web": [BEGIN, Span(DOWN, "web status 3", False), Span(RECOVERY, "web start 1"),
+                 Span(UP, f"web status 9 +{WEB.general}")]},
+        {"web": Figures(tried=1, successful=1)},
+        later=(0, 200)),
 }
 
 
