@@ -411,7 +411,7 @@ void logreader::work::readlogged(linehead head, std::string_view text, std::stri
         const recogniser::found found = known.find(head.who, said);
         const std::size_t next = findnext(found, said);
         if (next == std::string_view::npos) {
-            if (found.form != nullptr) {
+            if (found.form != nullptr && !found.form->varies) {
                 memo.keep(head.who, said, found);
             }
             take(head, found, said, from);

@@ -77,6 +77,7 @@ pattern takeapart(const messageform& form, speakerid who)
         made.literals.at(made.values) = takeliteral(rest);
         last = name;
     }
+    made.varies = std::count(made.isnumber.begin(), made.isnumber.end(), true) > 1;
     const bool oneline = isamong(kOneLine, last) || (last == kDependent && !commandbefore);
     made.goeson = made.values > 0 && made.literals.at(made.values).empty() &&
                   made.isconfigured.at(made.values - 1) && (listing || !oneline);

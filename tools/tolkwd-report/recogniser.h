@@ -39,6 +39,7 @@ struct pattern {
     std::array<bool, kMostValues> isnumber{};
     std::array<bool, kMostValues> isconfigured{}; // text of the configuration: may hold anything
     std::size_t values = 0;
+    bool varies = false; // has several numbers: hardly any text of it comes twice
     bool goeson = false; // ends in a text of the configuration whose further lines may follow
 };
 

@@ -11,7 +11,9 @@ void textmemo::keep(speakerid who, std::string_view text, const recogniser::foun
     if (text.size() < kLeastBytes || text.size() > kMostBytes) {
         return;
     }
-    known& kept = texts[placeof(who, text)];
+    const std::size_t place = placeof(who, text);
+    known& kept = texts[place];
+    texts[neighbour(place)] = kept;
     kept.meant = found.form;
     kept.size = static_cast<std::uint8_t>(text.size());
     kept.who = who;

@@ -15,7 +15,8 @@
 
 namespace report {
 
-// One thread's. Of fixed size: a text takes the place of another.
+// One thread's. Of fixed size: a text takes the place of another, which moves on to the next place
+// once before it is forgotten.
 class textmemo {
 public:
     static constexpr std::size_t kLeastBytes = 2 * kWordBytes; // shorter texts,
@@ -56,19 +57,29 @@ public:
         if (text.size() < kLeastBytes || text.size() > kMostBytes) {
             return nullptr;
         }
-        const known& kept = texts[placeof(who, text)];
-        return kept.is(who, text) ? &kept : nullptr;
+        const std::size_t place = placeof(who, text);
+        if (texts[place].is(who, text)) {
+            return &texts[place];
+        }
+        const known& other = texts[neighbour(place)];
+        return other.is(who, text) ? &other : nullptr;
     }
 
     // Keeps what it is, which has a form.
     void keep(speakerid who, std::string_view text, const recogniser::found& found) noexcept;
 
 private:
-    static constexpr std::size_t kPlaces = 2048; // a power of two
+    static constexpr std::size_t kPlaces = 1024; // a power of two
 
     std::vector<known> texts;
 
     [[nodiscard]] static std::size_t placeof(speakerid who, std::string_view text) noexcept;
+
+    // Where a text is that was at `place` until another one took it.
+    [[nodiscard]] static constexpr std::size_t neighbour(std::size_t place) noexcept
+    {
+        return place ^ 1U;
+    }
 };
 
 // Two words at a time, of which the last overlap the ones before.
