@@ -21,7 +21,9 @@ cd "$built/bench"
 lockwait/bench_lockwait --out "$results/lockwait.json"
 "$root/bench/check/measure.py" --check "$built/tools/tolkwd-check/tolkwd-check" \
     --load check/bench_check_load --out "$results/check.json"
+"$root/bench/logs/measure.py" --report "$built/tools/tolkwd-report/tolkwd-report" \
+    --out "$results/logs.json"
 "$root/bench/process/measure.py" --tolkwd "$built/src/tolkwd" --service process/service \
     --out "$results/process.json"
 
-"$root/bench/report/report.py" "$results"/{pieces,check,process,lockwait,counts}.json
+"$root/bench/report/report.py" "$results"/{pieces,check,logs,process,lockwait,counts}.json
