@@ -573,6 +573,19 @@ TEST(Clock, ThatIsSetIsToldAndReckonedWithout)
     EXPECT_THAT(told.happened({eventkind::kDaemon}), ElementsAre("270 - daemon*"));
 }
 
+TEST(Clock, ThatIsSetIsTheOneByWhichWhatIsInferredLaterIsDated)
+{
+    story told;
+    told.hear({0, kOne, kServiceFailed, "web"}, {10000, 0});
+    told.hear({0, kTwo, kServiceFailed, "mail"}, {10000, 0});
+    told.hear({0, kThree, kCheckBegins, "/x"}, {13700, 100});
+    told.hear({0, kTwo, kCheckBegins, "/mail"}, {13720, 120});
+    told.hear({0, kOne, kCheckBegins, "/web"}, {14600, 1000});
+    told.finish("web", 1001);
+    EXPECT_EQ(told.of("web").now.from, (report::instant{13810, 210}));
+    EXPECT_EQ(told.of("mail").now.from, (report::instant{13720, 120}));
+}
+
 TEST(Clock, OfLinesThatStandOutOfOrderDoesNotGoBack)
 {
     story told(web({}));

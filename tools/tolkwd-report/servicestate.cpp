@@ -331,7 +331,12 @@ bool servicestate::isretried() const noexcept
 
 instant servicestate::lastretry() const noexcept
 {
-    return later(failed, lastretryseconds(now.what));
+    const instant result = later(failed, lastretryseconds(now.what));
+    if (clockchange && secondsbetween(failed, *clockchange) > 0 &&
+        secondsbetween(*clockchange, result) >= 0) {
+        return later(*clockchange, secondsbetween(*clockchange, result));
+    }
+    return result;
 }
 
 // It runs: if this is the first word since the announcement, and comes soon enough, it tells how

@@ -59,6 +59,10 @@ public:
     // any moment, its thread had come to the end of its round first.
     void unwatch(const instant& when, bool inferred, inference why, bool steps, turns& told);
 
+    // The log's clock was changed; `when` is the first moment after that. What is inferred to have
+    // been later is dated by the new clock.
+    void changeclock(const instant& when) noexcept { clockchange = when; }
+
     // Draws the conclusions that silence up to `when` allows, and ends the last span there. Nothing
     // may be heard after it.
     void conclude(const instant& when, bool steps, turns& told);
@@ -114,6 +118,7 @@ private:
     instant announced;
     instant failed;
     instant checkbegan;
+    std::optional<instant> clockchange; // the last one
 
     // Of the spans that stand.
     bool wasoutage = false;

@@ -332,6 +332,9 @@ void tracker::work::noteclock(const instant& before)
         silentto = last;
     }
     if (std::abs(last.clock - before.clock - passed) > kClockChangeSeconds) {
+        for (watched& each : services) {
+            each.course.changeclock(last);
+        }
         tellofall(eventkind::kDaemon, inference::kClockChanged);
     }
 }
