@@ -35,7 +35,7 @@ TEST(Fitted, WritesOutWhatSteersATerminal)
 {
     EXPECT_EQ(fitted("a\033[31mb\tc\n", 80), "a\\x1b[31mb\\x09c\\x0a");
     EXPECT_EQ(fitted("\xff", 80), "\\xff");
-    EXPECT_EQ(fitted("\xe2\x80\xae txt", 80), "\\u{202e} txt");
+    EXPECT_EQ(fitted("\xe2\x80\x8b txt", 80), "\\u{200b} txt");
 }
 
 TEST(Filled, CountsColumnsNotBytes)

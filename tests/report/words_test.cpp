@@ -10,7 +10,6 @@
 namespace report {
 namespace {
 
-using testing::ElementsAre;
 using testing::HasSubstr;
 
 // Tells a narrator what happens to one service, in seconds since the first event.
@@ -59,7 +58,8 @@ private:
 TEST(Words, TellAnOutageThatARecoveryEnds)
 {
     story web;
-    EXPECT_EQ(web.said(0, messageid::kServiceNamed, state::kUp), "watched from now on, and taken to be up");
+    EXPECT_EQ(web.said(0, messageid::kServiceNamed, state::kUp),
+              "watched from now on, and taken to be up");
     EXPECT_EQ(web.said(0, messageid::kBinaryPathNamed, {}, "/usr/sbin/webd"),
               "its program is /usr/sbin/webd");
     EXPECT_EQ(web.said(60, messageid::kServiceFailed, state::kSuspect),

@@ -85,7 +85,9 @@ std::string inoneline(std::string_view text)
 
 std::string blanks(const std::string& text, std::size_t width)
 {
-    return std::string(width - std::min(width, columnsof(text)), ' ');
+    std::string result;
+    result.resize(width - std::min(width, columnsof(text)), ' ');
+    return result;
 }
 
 } // namespace

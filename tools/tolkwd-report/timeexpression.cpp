@@ -115,7 +115,7 @@ std::int64_t monthof(std::string_view text)
 {
     constexpr std::array<std::string_view, 12> kMonths{"jan", "feb", "mar", "apr", "may", "jun",
                                                        "jul", "aug", "sep", "oct", "nov", "dec"};
-    const auto found = std::find(kMonths.begin(), kMonths.end(), text);
+    const auto* const found = std::find(kMonths.begin(), kMonths.end(), text);
     return found == kMonths.end() ? 0 : found - kMonths.begin() + 1;
 }
 
