@@ -221,6 +221,13 @@ TEST(Status, OfALogWithoutServicesAsksForALook)
     EXPECT_EQ(textof(empty), "no service is named in the log\n\nno message of tolkwd in 0 lines\n");
 }
 
+TEST(Status, OfALogWithoutATimeTellsNone)
+{
+    overview untimed; // no more than what went to standard error
+    untimed.count.lines = untimed.count.messages = 1;
+    EXPECT_THAT(textof(untimed), EndsWith("\n1 line, none of which tells when it was\n"));
+}
+
 TEST(Status, OfAFailedLoadAsksForALook)
 {
     overview all = seen({service("web", state::kNotWatched)});

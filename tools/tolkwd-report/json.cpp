@@ -8,9 +8,9 @@ namespace {
 
 using nlohmann::ordered_json;
 
-ordered_json spanjson(const readcount& count, const instant& when)
+ordered_json timejson(const readcount& count, const instant& when)
 {
-    return count.messages == 0 ? ordered_json() : ordered_json(isotext(when));
+    return hastime(count) ? ordered_json(isotext(when)) : ordered_json();
 }
 
 ordered_json logjson(const overview& seen)
@@ -21,8 +21,8 @@ ordered_json logjson(const overview& seen)
     }
     const readcount& count = seen.count;
     return {{"files", files},
-            {"from", spanjson(count, count.first)},
-            {"to", spanjson(count, count.last)},
+            {"from", timejson(count, count.first)},
+            {"to", timejson(count, count.last)},
             {"lines", count.lines},
             {"messages", count.messages},
             {"foreign", count.foreign},

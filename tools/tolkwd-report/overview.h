@@ -17,6 +17,12 @@ public:
     using std::runtime_error::runtime_error;
 };
 
+// Whether any message that was read has a time; what goes to standard error has none.
+inline bool hastime(const readcount& count) noexcept
+{
+    return count.last != instant{};
+}
+
 struct overview {
     std::vector<std::string> files{}; // as they were given
     readcount count{};

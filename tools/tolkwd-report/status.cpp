@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <array>
-#include <cmath>
 #include <string>
 #include <string_view>
 #include <tuple>
@@ -123,13 +122,18 @@ std::string shortcount(std::uint64_t count)
 }
 
 // Rounded down, so that only what was never out has 100 %.
-std::string sharetext(const std::optional<double>& share)
+std::string availabilitytext(const account& service)
 {
-    if (!share) {
+    if (service.watchedseconds <= 0) {
         return "-";
     }
-    constexpr double kSteps = 10000;
-    return *share >= 1 ? "100%" : fmt::format("{:.2f}%", std::floor(*share * kSteps) / 100);
+    if (service.outageseconds <= 0) {
+        return "100%";
+    }
+    constexpr std::int64_t kHundredths = 10000;
+    const std::int64_t share =
+        (service.watchedseconds - service.outageseconds) * kHundredths / service.watchedseconds;
+    return fmt::format("{}.{:02}%", share / 100, share % 100);
 }
 
 // One column of the table.
@@ -227,14 +231,14 @@ private:
     static constexpr std::size_t kColumns = kShare + 1;
     static constexpr std::size_t kMarkColumns = 2;
 
-    static std::string_view gapbefore(std::size_t place) noexcept
+    static std::string_view gapbefore(std::size_t where) noexcept
     {
-        return place == kName ? "" : place <= kLast ? "  " : " ";
+        return where == kName ? "" : where <= kLast ? "  " : " ";
     }
 
-    [[nodiscard]] std::string filled(std::size_t place, std::string text, std::size_t width) const
+    [[nodiscard]] std::string filled(std::size_t where, std::string text, std::size_t width) const
     {
-        return columns.at(place).right ? filledbefore(std::move(text), width)
+        return columns.at(where).right ? filledbefore(std::move(text), width)
                                        : filledbehind(std::move(text), width);
     }
 
@@ -252,7 +256,7 @@ private:
         put(kRecoveries, fmt::format("{}/{}", shortcount(service.recoveriessuccessful),
                                      shortcount(service.recoveriestried)));
         put(kSkips, shortcount(service.skippedchecks));
-        put(kShare, sharetext(service.availability()));
+        put(kShare, availabilitytext(service));
     }
 
     [[nodiscard]] std::string timetext(const instant& when) const
@@ -325,6 +329,10 @@ void writesources(std::ostream& out, const overview& seen)
     const readcount& count = seen.count;
     if (count.messages == 0) {
         out << "no message of tolkwd in " << counted(count.lines, "line", "lines") << '\n';
+        return;
+    }
+    if (!hastime(count)) {
+        out << counted(count.lines, "line", "lines") << ", none of which tells when it was\n";
         return;
     }
     out << fmt::format("log from {} to {}, {}\n", clocktext(count.first), clocktext(count.last),
