@@ -97,7 +97,7 @@ def test_a_log_that_cannot_be_read_has_a_status_of_its_own(run, tmp_path, comman
     result = run(*command, name)
     shown = name.replace("\x1b", "\\x1b")
     first, second = result.stderr.splitlines()
-    assert result.returncode == 2
+    assert (result.returncode, result.stdout) == (2, "")
     assert first == f"tolkwd-report: {shown}: {reason}"
     assert "tolkwd-report status -" in second
     assert not (tmp_path / "page.html").exists()
@@ -194,8 +194,9 @@ def has_form(value, form):
     return type(value) is form
 
 
-LOGS = {"nothing": "", "foreign lines": "nobody\nwrote this\n", "healthy": HEALTHY,
-        "recovered": RECOVERED, "given up": GIVEN_UP, "not loaded": UNLOADED,
+UNTIMED = "error, unable to open the input file: 0\n"
+LOGS = {"nothing": "", "no time": UNTIMED, "foreign lines": "nobody\nwrote this\n",
+        "healthy": HEALTHY, "recovered": RECOVERED, "given up": GIVEN_UP, "not loaded": UNLOADED,
         "an outage that lasts": HEALTHY + failed("web", 60)}
 
 
@@ -207,6 +208,12 @@ def test_json_has_its_form(run, name):
     assert has_form(said, EVENTS), said
     for text in run("events", "--json", "--follow", log=LOGS[name]).stdout.splitlines():
         assert has_form(json.loads(text), {"version": int, **EVENT}), text
+
+
+def test_a_log_without_a_time_tells_none(run):
+    said = json.loads(run("status", "--json", log=UNTIMED).stdout)
+    assert (said["log"]["from"], said["log"]["to"], said["log"]["messages"]) == (None, None, 1)
+    assert "1 line, none of which tells when it was" in run("status", "--now", log=UNTIMED).stdout
 
 
 def test_json_tells_what_the_table_tells(run):
@@ -283,6 +290,13 @@ def test_steps_are_told_to_who_wants_all(run):
     assert ("15:00:10", "to be asked again in 60 s") in words_of(run("events", "--all", log=log))
     assert ("15:00:10", "to be asked again in 60 s") in words_of(
         run("events", "--kind", "step", log=log))
+
+
+def test_a_refresh_is_told_once(run):
+    log = HEALTHY + watched("web", 10800) + watched("db", 10800, thread=2)
+    assert len(run("events", log=log).stdout.splitlines()) == 3
+    assert "all services are watched anew" in run("events", log=log).stdout
+    assert ("18:00:00", "watched anew") in words_of(run("events", "--all", log=log))
 
 
 def test_logs_are_read_in_order(run, tmp_path):

@@ -44,13 +44,13 @@ message said(messageid id, std::string_view text)
 TEST(Routine, IsWhatHealthyServicesMakeAllDay)
 {
     for (const eventkind kind : {eventkind::kStep, eventkind::kChecked, eventkind::kSkipped,
-                                 eventkind::kFigures, eventkind::kUnknown}) {
+                                 eventkind::kFigures, eventkind::kWatched, eventkind::kUnknown}) {
         EXPECT_TRUE(isroutine(happened(kind))) << wordof(kind);
     }
     for (const eventkind kind :
-         {eventkind::kWatched, eventkind::kUnwatched, eventkind::kState, eventkind::kFailed,
-          eventkind::kRecoveryTried, eventkind::kRecovered, eventkind::kGaveUp,
-          eventkind::kConfiguration, eventkind::kDaemon}) {
+         {eventkind::kUnwatched, eventkind::kState, eventkind::kFailed, eventkind::kRecoveryTried,
+          eventkind::kRecovered, eventkind::kGaveUp, eventkind::kConfiguration,
+          eventkind::kDaemon}) {
         EXPECT_FALSE(isroutine(happened(kind))) << wordof(kind);
     }
 }
@@ -64,12 +64,10 @@ TEST(Routine, IsNothingThatBeginsAState)
 
 TEST(Routine, IsWhatOnlyRepeatsTheConfiguration)
 {
-    const message path = said(messageid::kBinaryPathNamed, "");
     const message listing = said(messageid::kListing, "");
-    const message name = said(messageid::kServiceNamed, "");
-    EXPECT_TRUE(isroutine(happened(eventkind::kWatched, &path)));
+    const message unloaded = said(messageid::kLoadFailed, "");
     EXPECT_TRUE(isroutine(happened(eventkind::kConfiguration, &listing)));
-    EXPECT_FALSE(isroutine(happened(eventkind::kWatched, &name)));
+    EXPECT_FALSE(isroutine(happened(eventkind::kConfiguration, &unloaded)));
 }
 
 TEST(Filter, LeavesOutTheRoutineUnlessAskedForIt)

@@ -59,6 +59,12 @@ std::string jsontext(const event& what, const std::string* name, const std::stri
     return textof(object, -1);
 }
 
+// Not written before it is sure that the log can be read.
+std::string documentbegin()
+{
+    return fmt::format(R"({{"version":{},"events":[)", kFormatVersion);
+}
+
 void ensure(const std::ostream& out)
 {
     if (!out) {
@@ -78,12 +84,11 @@ bool isroutine(const event& what) noexcept
     case eventkind::kChecked:
     case eventkind::kSkipped:
     case eventkind::kFigures:
-    case eventkind::kUnknown: // the same as in the round before
+    case eventkind::kWatched: // at each refresh, as before
+    case eventkind::kUnknown: // at each round, as before
         return true;
-    default:
-        // Its program is told behind its name; the listing is the configuration once more.
-        return what.source != nullptr && (what.source->id == messageid::kBinaryPathNamed ||
-                                          what.source->id == messageid::kListing);
+    default: // the listing is the configuration once more
+        return what.source != nullptr && what.source->id == messageid::kListing;
     }
 }
 
@@ -105,9 +110,6 @@ bool iswanted(const eventfilter& filter, const event& what, const std::string* n
 eventwriter::eventwriter(std::ostream& stream, eventfilter wished, eventform written)
     : out(stream), filter(std::move(wished)), form(written)
 {
-    if (form == eventform::kDocument) {
-        out << fmt::format("{{\"version\":{},\"events\":[", kFormatVersion);
-    }
 }
 
 void eventwriter::told(const event& what, const std::string* name)
@@ -123,7 +125,8 @@ void eventwriter::told(const event& what, const std::string* name)
         writeline(out, what, name, words, form == eventform::kColouredText);
         break;
     case eventform::kDocument:
-        out << (std::exchange(first, false) ? "\n" : ",\n") << jsontext(what, name, words, false);
+        out << (std::exchange(first, false) ? documentbegin() + "\n" : ",\n")
+            << jsontext(what, name, words, false);
         break;
     case eventform::kLines:
         out << jsontext(what, name, words, true) << '\n';
@@ -141,7 +144,7 @@ void eventwriter::flush()
 void eventwriter::end()
 {
     if (form == eventform::kDocument) {
-        out << (first ? "]}\n" : "\n]}\n");
+        out << (first ? documentbegin() : "\n") << "]}\n";
     }
 }
 

@@ -23,8 +23,8 @@ struct eventfilter {
     bool all = false;                    // also what is routine
 };
 
-// Whether `what` is routine, as healthy services make it all day: checks, those left out, figures
-// and steps, unless a state begins with it. Any thread.
+// Whether `what` is routine, as healthy services make it all day: checks, those left out, figures,
+// announcements and steps, unless a state begins with it. Any thread.
 bool isroutine(const event& what) noexcept;
 
 // Whether an event of the service `name`, null for none, is wanted. Whoever names kinds wants the

@@ -14,8 +14,6 @@ namespace {
 bool ismarked(const event& what) noexcept
 {
     switch (what.kind) {
-    case eventkind::kWatched:
-        return what.source != nullptr && what.source->id == messageid::kServiceNamed;
     case eventkind::kFailed:
     case eventkind::kRecoveryTried:
     case eventkind::kRecovered:

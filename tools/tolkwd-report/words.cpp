@@ -203,7 +203,7 @@ std::string giveupwords(const tale& past)
 std::string announcementwords(const event& what, const tale& past)
 {
     if (what.became != state::kUp) {
-        return past.outage ? "watched anew" : "watched from now on";
+        return "watched anew";
     }
     if (!past.outage) {
         return "watched from now on, and taken to be up";
