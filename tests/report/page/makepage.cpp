@@ -290,7 +290,7 @@ pagecontents clocks()
 pagecontents years()
 {
     pagecontents contents;
-    const std::int64_t end = 3 * 365 * kDay;
+    const std::int64_t end = 1095 * kDay;
     describe(contents, end, 5000);
     story told(contents, "web", "/usr/sbin/nginx");
     told.from(0, state::kUp, true);
