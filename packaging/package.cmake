@@ -59,7 +59,8 @@ set(CPACK_RPM_PACKAGE_REQUIRES /usr/sbin/service)
 set(CPACK_RPM_PACKAGE_RELEASE 1)
 configure_file(${rpm}/changelog.in changelog.rpm @ONLY)
 set(CPACK_RPM_CHANGELOG_FILE ${CMAKE_CURRENT_BINARY_DIR}/changelog.rpm)
-set(CPACK_RPM_PACKAGE_LICENSE Apache-2.0)
+# The others are those of what the pages of tolkwd-report draw with, see debian/copyright.
+set(CPACK_RPM_PACKAGE_LICENSE "Apache-2.0 AND BSD-3-Clause AND MIT")
 # Links by build id are for programs whose debug information is packaged, too.
 set(CPACK_RPM_SPEC_MORE_DEFINE "%define _build_id_links none")
 set(CPACK_RPM_PACKAGE_GROUP "System Environment/Daemons")

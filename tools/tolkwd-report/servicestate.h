@@ -110,7 +110,7 @@ private:
     bool known = false;
     bool checkopen = false;         // a check was begun in a state that only its result ends
     bool recoveryannounced = false; // a functional recovery: its general part is to be named yet
-    bool retold = false; // the beginning that was told last has been refuted
+    bool retold = false;            // the beginning that was told last has been refuted
     doubt open = doubt::kNone;
     span now;
     instant least;            // `now` lasts until then
