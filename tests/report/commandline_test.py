@@ -57,6 +57,7 @@ RECOVERED = (HEALTHY + failed("web", 60) + tried("web", 270) + failed("web", 330
              + tried("web", 540) + recovered("web", 660))
 GIVEN_UP = HEALTHY + failed("web", 60) + tried("web", 270) + gaveup("web", 330)
 UNLOADED = HEALTHY + line(100, "Loadservices error.", module="wdmanager")
+ENDED = line(100, "Failed to init the pingreclock.", module="wdmanager")
 
 
 @pytest.fixture
@@ -72,7 +73,7 @@ def run(program, tmp_path):
 
 @pytest.mark.parametrize("log, status", [
     (HEALTHY, 0), (RECOVERED, 0), (HEALTHY + failed("web", 60), 1), (GIVEN_UP, 1), (UNLOADED, 1),
-    ("", 1), ("nobody\nwrote\nthis\n", 1)])
+    (HEALTHY + ENDED, 1), ("", 1), ("nobody\nwrote\nthis\n", 1)])
 @pytest.mark.parametrize("form", [[], ["--json"]])
 def test_the_status_tells_whether_somebody_should_look(run, form, log, status):
     result = run("status", *form, log=log)

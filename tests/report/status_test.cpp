@@ -164,19 +164,20 @@ TEST_P(AnyState, FitsInto80Columns)
     for (const std::string& name :
          {std::string("web"), std::string(300, 'x'), std::string("数据库服务器连接"),
           std::string(20, '\033'), std::string("\xff\xfe\n\t"), std::string()}) {
-        const auto lines = linesof(seen({eventful(name, what)}));
+        const auto lines = linesof(seen({eventful(name, what), service("web", state::kUp)}));
         EXPECT_LE(columnsof(lines.at(0)), 80U) << lines[0];
         EXPECT_EQ(columnsof(lines.at(0)), columnsof(lines.at(1))) << lines[1];
-        EXPECT_EQ(lines.at(2), "") << lines[2];
+        EXPECT_EQ(columnsof(lines.at(0)), columnsof(lines.at(2))) << lines[2];
+        EXPECT_EQ(lines.at(3), "") << lines[3];
     }
 }
 
 TEST_P(AnyState, IsToldInFullWhereThereIsRoom)
 {
     const auto what = static_cast<state>(GetParam());
-    EXPECT_THAT(linesof(seen({service("web", what)})).at(1),
+    EXPECT_THAT(linesof(seen({service("web", what), service("zeb")})).at(1),
                 HasSubstr(' ' + std::string(wordof(what)) + ' '));
-    EXPECT_THAT(linesof(seen({eventful(std::string(100, 'x'), what)}), 250).at(1),
+    EXPECT_THAT(linesof(seen({eventful(std::string(100, 'x'), what), service("zeb")}), 250).at(1),
                 HasSubstr(std::string(100, 'x') + "  " + std::string(wordof(what))));
 }
 
@@ -230,11 +231,30 @@ TEST(Status, OfALogWithoutATimeTellsNone)
 
 TEST(Status, OfAFailedLoadAsksForALook)
 {
-    overview all = seen({service("web", state::kNotWatched)});
+    overview all = seen({service("web"), service("db", state::kNotWatched)});
     EXPECT_EQ(statusof(all), 0);
     all.loadfailed = true;
     EXPECT_EQ(statusof(all), 1);
     EXPECT_THAT(textof(all), StartsWith("the configuration could not be loaded"));
+}
+
+TEST(Status, WhereNothingIsWatchedAsksForALook)
+{
+    const overview all =
+        seen({service("web", state::kNotWatched), service("db", state::kNotWatched, 11)});
+    EXPECT_EQ(statusof(all), 1);
+    EXPECT_THAT(textof(all), StartsWith("nothing is watched: "));
+    const overview one = seen({service("web", state::kNotWatched), service("db")});
+    EXPECT_EQ(statusof(one), 0);
+    EXPECT_THAT(textof(one), Not(HasSubstr("nothing is watched")));
+}
+
+TEST(Status, LeavesARefreshTheTimeThatItTakes)
+{
+    const overview all =
+        seen({service("web", state::kNotWatched, 700), service("db", state::kNotWatched, 10)});
+    EXPECT_EQ(statusof(all), 0);
+    EXPECT_THAT(textof(all), Not(HasSubstr("nothing is watched")));
 }
 
 TEST(Status, TellsWhatWasRead)

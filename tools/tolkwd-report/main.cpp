@@ -231,7 +231,7 @@ void addstatus(CLI::App& app, options& chosen)
         "While all is well a daemon may write nothing for long; a log does not tell that\n"
         "from its end. A state marked with ~ is inferred: no message says so, or when.\n\n"
         "Exit status: 0 where all services are up, busy or not watched, 1 where somebody\n"
-        "should look, 2 where a log cannot be read.");
+        "should look or nothing is watched at all, 2 where a log cannot be read.");
     command.callback([&chosen] { chosen.run = runstatus; });
 }
 

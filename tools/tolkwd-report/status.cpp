@@ -25,6 +25,10 @@ constexpr std::int64_t kDaySeconds = 24 * kHourSeconds;
 constexpr std::int64_t kSilenceSeconds =
     kFirstRetryPauseSeconds + kRetries * kGeneralRetryPauseSeconds + kPatienceSeconds;
 
+// From the end of a refresh's last thread to the first announcement: a second, and the time to
+// load.
+constexpr std::int64_t kRefreshSeconds = 10;
+
 constexpr std::size_t kLeastNameColumns = 8;
 
 // How a state is shown: never by its colour alone.
@@ -377,6 +381,28 @@ std::vector<std::string> silentsincefailure(const overview& seen)
     return names;
 }
 
+// No thread is left that would tell of anything; a refresh that is under way takes a moment.
+bool nothingwatched(const overview& seen) noexcept
+{
+    return !seen.services.empty() &&
+           std::all_of(seen.services.begin(), seen.services.end(), [&](const account& each) {
+               return each.now.what == state::kNotWatched &&
+                      secondsbetween(each.now.from, seen.present) > kRefreshSeconds;
+           });
+}
+
+// Why there is nothing to be told of any service from now on.
+std::string_view standstill(const overview& seen) noexcept
+{
+    if (seen.loadfailed) {
+        return "the configuration could not be loaded: nothing is watched until a refresh can";
+    }
+    if (nothingwatched(seen)) {
+        return "nothing is watched: the daemon has ended, or has found no service to watch";
+    }
+    return {};
+}
+
 void writecautions(std::ostream& out, const overview& seen)
 {
     const auto inferred = [](const account& each) {
@@ -396,12 +422,8 @@ void writecautions(std::ostream& out, const overview& seen)
 
 void writestatus(std::ostream& out, const overview& seen, std::size_t columns, bool colour)
 {
-    if (seen.loadfailed) {
-        out << tools::coloured(tools::kRed,
-                               "the configuration could not be loaded: nothing is watched until a "
-                               "refresh can",
-                               colour)
-            << '\n';
+    if (const std::string_view why = standstill(seen); !why.empty()) {
+        out << tools::coloured(tools::kRed, std::string(why), colour) << '\n';
     }
     if (seen.services.empty()) {
         out << "no service is named in the log\n";
@@ -415,7 +437,7 @@ void writestatus(std::ostream& out, const overview& seen, std::size_t columns, b
 
 int statusof(const overview& seen) noexcept
 {
-    const bool trouble = seen.loadfailed || seen.services.empty() ||
+    const bool trouble = seen.services.empty() || !standstill(seen).empty() ||
                          std::any_of(seen.services.begin(), seen.services.end(),
                                      [](const account& each) { return istrouble(each.now.what); });
     return trouble ? 1 : 0;
