@@ -232,6 +232,12 @@ def test_json_tells_what_the_table_tells(run):
     assert (database["state"], database["outages"], database["lastoutage"]) == ("up", 0, None)
 
 
+def test_json_has_the_services_in_the_order_of_the_log(run):
+    said = json.loads(run("status", "--json", log=HEALTHY + failed("db", 60, thread=2)).stdout)
+    assert [(each["service"], each["state"]) for each in said["services"]] == [
+        ("web", "up"), ("db", "suspect")]
+
+
 def words_of(result):
     """Time and words of each line, for names that fit into their column."""
     return [(text[11:19], text[40:]) for text in result.stdout.splitlines()]
