@@ -235,6 +235,8 @@ void recogniser::addspeaker(const messageform& form)
         assert(added.head.size() >= speaker::kLeastHeadBytes &&
                added.head.size() <= speaker::kMostHeadBytes);
         keys.push_back(keyof(added.head));
+        guesses.at(guessof(keys.back().first, keys.back().second)) =
+            static_cast<speakerid>(keys.size() - 1);
     }
     starts.emplace_back().first.fill(kNone);
 }

@@ -4,6 +4,7 @@
 #pragma once
 
 #include <array>
+#include <bit>
 #include <cstddef>
 #include <cstdint>
 #include <span>
@@ -70,11 +71,17 @@ public:
         }
         const std::uint64_t first = wordat(text.data());
         const std::uint64_t second = wordat(text.data() + kWordBytes);
-        for (std::size_t who = 0; who < keys.size(); ++who) {
-            const headkey& key = keys[who];
+        const auto is = [&](const headkey& key) {
             const char* const tail = text.data() + key.tailat;
-            if (((first ^ key.first) | (second ^ key.second) | (wordat(tail) ^ key.third) |
-                 (wordat(tail + kWordBytes) ^ key.fourth)) == 0) {
+            return ((first ^ key.first) | (second ^ key.second) | (wordat(tail) ^ key.third) |
+                    (wordat(tail + kWordBytes) ^ key.fourth)) == 0;
+        };
+        const speakerid likely = guesses[guessof(first, second)];
+        if (is(keys[likely])) {
+            return likely;
+        }
+        for (std::size_t who = 0; who < keys.size(); ++who) {
+            if (is(keys[who])) {
                 return static_cast<speakerid>(who);
             }
         }
@@ -115,10 +122,21 @@ private:
         std::size_t tailat = 0; // where these are
     };
     static headkey keyof(std::string_view head) noexcept;
+
+    // Where to look first for a head with these first two words.
+    static constexpr std::size_t kGuesses = 64;
+    static std::size_t guessof(std::uint64_t first, std::uint64_t second) noexcept
+    {
+        constexpr std::uint64_t kSpread = 0x9e3779b97f4a7c15; // odd, without a pattern
+        constexpr unsigned kHighBits = 40;
+        return static_cast<std::size_t>(((first ^ std::rotl(second, 21)) * kSpread) >> kHighBits) %
+               kGuesses;
+    }
     [[nodiscard]] speakerid searchspeaker(std::string_view text) const noexcept;
 
     std::vector<speaker> voices;
     std::vector<headkey> keys; // of the speakers; standard error's is that of no line
+    std::array<speakerid, kGuesses> guesses{};
     std::vector<pattern> patterns;
     std::vector<std::uint8_t> next; // the pattern to try behind each
     std::vector<chains> starts;     // of each speaker
