@@ -1,12 +1,15 @@
 // Bytes of a log -> messages: whole and torn lines, those of others, the journal's forms; and that
-// it is the same in pieces of any size.
+// it is the same in pieces of any size, and with several threads.
 
 #include "logreader.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <cstdlib>
 #include <initializer_list>
+#include <stdexcept>
 #include <string>
+#include <system_error>
 #include <utility>
 #include <vector>
 
@@ -88,7 +91,46 @@ outcome readin(const std::vector<std::string>& files, std::size_t piece, wanted 
     return result;
 }
 
-// What is read of these files: the same in pieces of any size, and by one who wants to hear less.
+// Gives a text, at most so many bytes at once.
+bytesource sourceof(const std::string& text, std::size_t piece)
+{
+    return [&text, piece, place = std::size_t{0}](char* into, std::size_t most) mutable {
+        const std::size_t got = text.copy(into, std::min(most, piece), place);
+        place += got;
+        return got;
+    };
+}
+
+// Read in blocks by two threads, or more.
+outcome readahead(const std::vector<std::string>& files, const pace& how, wanted which)
+{
+    outcome result;
+    logreader reader(which, [&](const message& said) { result.messages.push_back(copyof(said)); });
+    for (const std::string& file : files) {
+        reader.feedall(sourceof(file, kMebibyte), how);
+        reader.endfile();
+    }
+    result.count = reader.count();
+    return result;
+}
+
+// Whoever takes the lines apart, and wherever the blocks end, it is the same.
+void expectsameahead(const std::vector<std::string>& files, wanted which, const outcome& expected)
+{
+    for (const pace& how :
+         {pace{.blockbytes = 1, .alone = 0, .helpers = 1},
+          pace{.blockbytes = 100, .alone = 0, .helpers = 2},
+          pace{.blockbytes = 300, .alone = 200, .helpers = 1},
+          pace{.blockbytes = 4096, .alone = 0, .helpers = 3},
+          pace{.blockbytes = 2 * kMebibyte, .alone = 0, .helpers = 0}, pace::ofmachine()}) {
+        const outcome ahead = readahead(files, how, which);
+        EXPECT_EQ(ahead.messages, expected.messages) << "in blocks of " << how.blockbytes;
+        EXPECT_TRUE(samecount(ahead.count, expected.count)) << "in blocks of " << how.blockbytes;
+    }
+}
+
+// What is read of these files: the same in pieces of any size, by any threads, and by one who wants
+// to hear less.
 outcome read(const std::vector<std::string>& files)
 {
     outcome whole = readin(files, std::string::npos, wanted::kAll);
@@ -104,6 +146,8 @@ outcome read(const std::vector<std::string>& files)
         EXPECT_EQ(less.messages, important);
         EXPECT_TRUE(samecount(less.count, whole.count));
     }
+    expectsameahead(files, wanted::kAll, whole);
+    expectsameahead(files, wanted::kWhatMatters, {important, whole.count});
     EXPECT_EQ(whole.count.messages, whole.messages.size());
     return whole;
 }
@@ -122,6 +166,7 @@ std::string logged(int second, const std::string& text,
            text;
 }
 
+const std::string kDebug = "DEBUG wdmonitorthread";
 const std::string kInfo = "INFO wdmonitorthread";
 const std::string kError = "ERROR wdmonitorthread";
 const std::string kListing = "DEBUG wdxmlparserhandler ";
@@ -539,6 +584,48 @@ TEST_F(Reader, TakesAnyBytes)
     const outcome result = read(lines({nul, nul + logged(1, kPing), logged(2, kTry + nul, kError),
                                        "\xff\xfe", logged(3, kPing)}));
     EXPECT_THAT(result.texts(), ElementsAre(kPing, kTry + nul, kPing));
+}
+
+TEST_F(Reader, ReadsALongLogWithSeveralThreadsInItsOrder)
+{
+    std::string log;
+    for (std::size_t number = 0; number < 20'000; ++number) {
+        const std::uint64_t thread = 140217598280000 + number % 50;
+        log += logged(static_cast<int>(number / 10 % 60), "General ping sleep 60", kDebug, thread);
+        log += "\n" + logged(static_cast<int>(number / 10 % 60), kPing, kDebug, thread) + "\n";
+        if (number % 7 == 0) {
+            log += "a line of somebody else\n";
+        }
+    }
+    const outcome alone = readin({log}, std::string::npos, wanted::kWhatMatters);
+    ASSERT_EQ(alone.messages.size(), 20'000U);
+    const pace how{.blockbytes = 1000, .alone = 5000, .helpers = 2};
+    const outcome ahead = readahead({log}, how, wanted::kWhatMatters);
+    EXPECT_EQ(ahead.messages, alone.messages);
+    EXPECT_TRUE(samecount(ahead.count, alone.count));
+}
+
+TEST_F(Reader, AReadThatFailsIsThrownBehindTheMessagesBefore)
+{
+    const std::string log = lines({logged(1, kPing), logged(2, kPing), logged(3, kPing)});
+    std::size_t heardof = 0;
+    logreader reader(wanted::kAll, [&](const message&) { ++heardof; });
+    bytesource bytes = sourceof(log, log.size());
+    const auto failing = [&](char* into, std::size_t most) {
+        const std::size_t got = bytes(into, most);
+        return got > 0 ? got : throw std::system_error(EIO, std::generic_category(), "web.log");
+    };
+    const pace how{.blockbytes = log.size(), .alone = 0, .helpers = 2};
+    EXPECT_THROW(reader.feedall(failing, how), std::system_error);
+    EXPECT_EQ(heardof, 3U);
+}
+
+TEST_F(Reader, AListenerThatThrowsEndsTheReading)
+{
+    const std::string log = lines({logged(1, kPing), logged(2, kPing), logged(3, kPing)});
+    logreader reader(wanted::kAll, [](const message&) { throw std::runtime_error("enough"); });
+    const pace how{.blockbytes = 100, .alone = 0, .helpers = 2};
+    EXPECT_THROW(reader.feedall(sourceof(log, log.size()), how), std::runtime_error);
 }
 
 TEST_F(Reader, NothingIsNothing)

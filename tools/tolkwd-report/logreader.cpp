@@ -4,24 +4,28 @@
 #include <array>
 #include <cstring>
 #include <limits>
+#include <memory>
 #include <optional>
+#include <thread>
 #include <utility>
 
-#include "bytes.h"
+#include "lexahead.h"
+#include "linehead.h"
+#include "linelexer.h"
 #include "logclock.h"
 #include "recogniser.h"
-#include "textmemo.h"
 
 namespace report {
 
 namespace {
 
-constexpr std::size_t kLongestLineBytes = 1 << 20; // what is longer is no line
-constexpr std::size_t kMostHeldBytes = 1 << 16;    // of lines that follow a message
+constexpr std::size_t kMostHeldBytes = 1 << 16; // of lines that follow a message
 constexpr std::size_t kMostHeldLines = 1000;
+constexpr std::size_t kBlockBytes = std::size_t{256} * 1024; // some stay in a processor's cache
+constexpr std::size_t kSmallLogBytes = std::size_t{4} * 1024 * 1024; // not worth other threads
+constexpr unsigned kMostThreads = 4;             // the reader's own cannot keep up with more
 constexpr std::size_t kLongestPrefixBytes = 512; // of the journal's, with its host name
 
-constexpr std::string_view kThreadMark = "|TID";
 constexpr std::string_view kPrefixEnd = "]: ";
 
 constexpr std::string_view kExportBegins = "__CURSOR=";
@@ -29,52 +33,9 @@ constexpr std::string_view kExportMessage = "MESSAGE";
 constexpr std::size_t kExportLengthBytes = 8;
 constexpr std::size_t kLongestFieldNameBytes = 64;
 
-constexpr std::array<std::uint64_t, kWordBytes + 1> kPowersOfTen = {
-    1, 10, 100, 1'000, 10'000, 100'000, 1'000'000, 10'000'000, 100'000'000};
-
 constexpr bool isdigit(char byte) noexcept
 {
     return byte >= '0' && byte <= '9';
-}
-
-// What stands before a message in its line.
-struct linehead {
-    std::int64_t clock = 0;
-    speakerid who = recogniser::kNobody;
-    std::string_view thread{}; // its digits
-    std::size_t bytes = 0;     // the head's length
-};
-
-// Of a line whose end was turned into two bytes on another system.
-std::string_view withoutreturn(std::string_view line)
-{
-    return line.substr(0, line.size() - (line.ends_with('\r') ? 1 : 0));
-}
-
-// The number of a thread that `text` begins with, as its digits; empty where there is none, or a
-// blank does not follow it.
-std::string_view threadin(std::string_view text)
-{
-    constexpr std::string_view kMost = "18446744073709551615";
-    std::size_t size = 0;
-    for (std::size_t digits = kWordBytes; digits == kWordBytes && size <= kMost.size();) {
-        digits = digitsin(wordof(text, size));
-        size += digits;
-    }
-    const std::string_view thread = text.substr(0, size);
-    const bool fits = size < kMost.size() || (size == kMost.size() && thread <= kMost);
-    return fits && size < text.size() && text[size] == ' ' ? thread : "";
-}
-
-std::uint64_t numberof(std::string_view digits)
-{
-    std::uint64_t value = 0;
-    while (!digits.empty()) {
-        const std::size_t size = std::min(digits.size(), kWordBytes);
-        value = value * kPowersOfTen[size] + numberin(wordof(digits, 0), size);
-        digits.remove_prefix(size);
-    }
-    return value;
 }
 
 // Who wrote a line, by the journal: the "tolkwd[123]: " that its prefix ends in.
@@ -114,9 +75,13 @@ struct heldmessage {
 
 class logreader::work {
 public:
-    work(wanted which, listener hear) : everything(which == wanted::kAll), told(std::move(hear)) {}
+    work(wanted which, listener hear)
+        : everything(which == wanted::kAll), told(std::move(hear)), lexer(everything)
+    {
+    }
 
     void feed(std::string_view bytes);
+    void feedall(const bytesource& read, const pace& how);
     void pause();
     void endfile();
 
@@ -142,7 +107,9 @@ private:
     const bool everything;
     const listener told;
     const recogniser& known = recogniser::ofall();
-    textmemo memo;
+    headreader heads;
+    linelexer lexer;
+    lexedbytes apart; // the bytes at hand
     const speakerid standarderror = known.speakerof(loglevel::kStandardError, {});
 
     part at = part::kLine;
@@ -160,7 +127,12 @@ private:
     bool isheld = false;  // `held` holds a message
     heldmessage held;
 
+    void feedlexed(const lexedbytes& block);
     std::string_view takelines(std::string_view bytes);
+    std::string_view takelexed(const lexedbytes& block);
+    std::string_view takeothers(std::string_view text);
+    void takemessage(const saidline& said);
+    void takecounted(std::int64_t when, std::uint32_t lines);
     std::string_view takeline(std::string_view bytes);
     std::string_view takerest(std::string_view bytes);
     std::string_view takelength(std::string_view bytes);
@@ -177,20 +149,16 @@ private:
     void readunlogged(std::string_view text);
     void follow(std::string_view text);
 
-    bool readhead(std::string_view text, linehead& head);
-    std::size_t findhead(std::string_view text);
     std::size_t findnext(const recogniser::found& found, std::string_view text);
-    void takeknown(const linehead& head, const textmemo::known& same, std::string_view text,
-                   std::string_view from);
-    void take(const linehead& head, const recogniser::found& found, std::string_view text,
-              std::string_view from);
-    void holdunwhole(const linehead& head, std::string_view text, std::string_view from);
+    void take(const saidline& said, std::string_view from);
+    void takefragment(const saidline& said, std::string_view from);
+    [[nodiscard]] message messageof(const saidline& said, const instant& when) const;
+    void hold(const saidline& said, const message& whole);
     void complete();
     void settle();
     void dropunwhole();
     void tellheld();
     instant moment(std::int64_t when);
-    void tell(message& said) { told(said); }
 };
 
 // ---- From bytes to lines.
@@ -204,7 +172,7 @@ void logreader::work::feed(std::string_view bytes)
             if (!partial.empty() || overlong) {
                 bytes = takerest(bytes);
             } else {
-                bytes = takeline(exported ? bytes : takelines(bytes));
+                bytes = exported ? takeline(bytes) : takelines(bytes);
             }
             break;
         case part::kFieldLength:
@@ -224,22 +192,92 @@ void logreader::work::feed(std::string_view bytes)
     }
 }
 
-// Nearly all lines begin with a head, and stand whole in what was given. Returns what stands behind
-// them.
+void logreader::work::feedall(const bytesource& read, const pace& how)
+{
+    const auto block = std::make_unique_for_overwrite<char[]>(how.blockbytes);
+    for (std::size_t ahead = 0; how.helpers == 0 || ahead < how.alone;) {
+        const std::size_t got = read(block.get(), how.blockbytes);
+        if (got == 0) {
+            return;
+        }
+        feed({block.get(), got});
+        ahead += got;
+    }
+    lexahead ahead({everything, how.blockbytes, how.helpers}, read);
+    while (const lexedbytes* const lines = ahead.next()) {
+        feedlexed(*lines);
+    }
+}
+
+// What was taken apart counts only where it does begin with a line.
+void logreader::work::feedlexed(const lexedbytes& block)
+{
+    if (at != part::kLine || !partial.empty() || overlong || exported) {
+        feed(block.bytes);
+        return;
+    }
+    count.bytes += block.bytes.size();
+    const std::string_view left = takelexed(block);
+    count.bytes -= left.size(); // and now again
+    feed(left);
+}
+
 std::string_view logreader::work::takelines(std::string_view bytes)
 {
-    linehead head;
-    while (readhead(bytes, head)) { // it holds no newline
-        const std::size_t end = bytes.find('\n', head.bytes);
-        if (end > kLongestLineBytes) {
+    lexer.lex(bytes, apart);
+    return takelexed(apart);
+}
+
+// Returns what was not taken: that is what stands behind the first line of a file, if that line
+// tells that the file has the export format.
+std::string_view logreader::work::takelexed(const lexedbytes& block)
+{
+    for (const lexed& next : block.lines) {
+        switch (next.what) {
+        case lexed::kind::kMessage:
+            takemessage(next.said);
+            break;
+        case lexed::kind::kCounted:
+            takecounted(next.said.clock, next.lines);
+            break;
+        case lexed::kind::kOther:
+            const std::string_view left = takeothers(next.said.text);
+            if (exported) {
+                return block.bytes.substr(
+                    static_cast<std::size_t>(left.data() - block.bytes.data()));
+            }
             break;
         }
-        line = ++count.lines;
-        isfirst = false;
-        readlogged(head, withoutreturn(bytes.substr(0, end)), {});
-        bytes.remove_prefix(end + 1);
     }
-    return bytes;
+    keep(block.rest);
+    return {};
+}
+
+// Whole lines. Returns what was not taken, likewise.
+std::string_view logreader::work::takeothers(std::string_view text)
+{
+    while (!text.empty() && !exported) {
+        text = takeline(text);
+    }
+    return text;
+}
+
+void logreader::work::takemessage(const saidline& said)
+{
+    line = ++count.lines;
+    isfirst = false;
+    settle();
+    take(said, {});
+}
+
+void logreader::work::takecounted(std::int64_t when, std::uint32_t lines)
+{
+    count.lines += lines;
+    count.messages += lines;
+    isfirst = false;
+    settle();
+    behind = following::kStrange;
+    (void)moment(when);
 }
 
 // Returns what stands behind the line.
@@ -382,7 +420,7 @@ void logreader::work::readexported(std::string_view text)
 void logreader::work::readentry(std::string_view text)
 {
     linehead head;
-    if (readhead(text, head)) {
+    if (heads.read(text, head)) {
         readlogged(head, text, {});
         return;
     }
@@ -390,7 +428,7 @@ void logreader::work::readentry(std::string_view text)
     for (std::size_t end = prefixes.find(kPrefixEnd); end != std::string_view::npos;
          end = prefixes.find(kPrefixEnd, end + 1)) {
         const std::size_t begin = end + kPrefixEnd.size();
-        if (readhead(text.substr(begin), head)) {
+        if (heads.read(text.substr(begin), head)) {
             readlogged(head, text.substr(begin), writerin(text.substr(0, begin)));
             return;
         }
@@ -403,38 +441,25 @@ void logreader::work::readlogged(linehead head, std::string_view text, std::stri
 {
     for (;;) {
         settle();
-        const std::string_view said = text.substr(head.bytes);
-        if (const auto* const same = memo.find(head.who, said)) {
-            takeknown(head, *same, said, from);
+        saidline said{.clock = head.clock,
+                      .who = head.who,
+                      .thread = numberof(head.thread),
+                      .text = text.substr(head.bytes)};
+        said.found = lexer.plainmessage(head.who, said.text);
+        if (said.found.form != nullptr) {
+            take(said, from);
             return;
         }
-        const recogniser::found found = known.find(head.who, said);
-        const std::size_t next = findnext(found, said);
+        said.found = known.find(head.who, said.text);
+        const std::size_t next = findnext(said.found, said.text);
         if (next == std::string_view::npos) {
-            if (found.form != nullptr && !found.form->varies) {
-                memo.keep(head.who, said, found);
-            }
-            take(head, found, said, from);
+            take(said, from);
             return;
         }
         ++count.torn;
-        text = said.substr(next);
-        readhead(text, head);
+        text = said.text.substr(next);
+        (void)heads.read(text, head);
     }
-}
-
-// A text that was taken before.
-void logreader::work::takeknown(const linehead& head, const textmemo::known& same,
-                                std::string_view text, std::string_view from)
-{
-    const pattern& form = same.form();
-    if (everything || form.matters || form.goeson) {
-        take(head, same.in(text), text, from);
-        return;
-    }
-    behind = following::kStrange;
-    ++count.messages;
-    moment(head.clock);
 }
 
 // What no head begins.
@@ -446,14 +471,14 @@ void logreader::work::readunlogged(std::string_view text)
     const recogniser::found found = known.find(standarderror, said);
     if (found.form != nullptr) {
         settle();
-        take({.who = standarderror}, found, said, from);
+        take({.who = standarderror, .found = found, .text = said}, from);
         return;
     }
-    const std::size_t next = findhead(text);
+    const std::size_t next = heads.find(text);
     if (next != std::string_view::npos) {
         ++count.torn;
         linehead head;
-        readhead(text.substr(next), head);
+        (void)heads.read(text.substr(next), head);
         readlogged(head, text.substr(next), {});
         return;
     }
@@ -489,48 +514,6 @@ void logreader::work::follow(std::string_view text)
     }
 }
 
-bool logreader::work::readhead(std::string_view text, linehead& head)
-{
-    if (text.size() <= logclock::kDateBytes) {
-        return false;
-    }
-    const std::string_view rest = text.substr(logclock::kDateBytes);
-    head.who = known.speakerof(rest);
-    if (head.who == recogniser::kNobody) {
-        return false;
-    }
-    const std::size_t before = known.speakers()[head.who].head.size();
-    head.thread = threadin(rest.substr(before));
-    if (head.thread.empty()) {
-        return false;
-    }
-    const auto clocktime = clock.read(text.data());
-    if (!clocktime) {
-        return false;
-    }
-    head.clock = *clocktime;
-    head.bytes = logclock::kDateBytes + before + head.thread.size() + 1;
-    return true;
-}
-
-// Where in `text` the first head begins.
-std::size_t logreader::work::findhead(std::string_view text)
-{
-    for (std::size_t mark = text.find(kThreadMark); mark != std::string_view::npos;
-         mark = text.find(kThreadMark, mark + 1)) {
-        const std::size_t end = mark + kThreadMark.size();
-        for (const speaker& voice : known.speakers()) {
-            const std::size_t before = logclock::kDateBytes + voice.head.size();
-            linehead head;
-            if (end >= before && text.substr(0, end).ends_with(voice.head) &&
-                readhead(text.substr(end - before), head)) {
-                return end - before;
-            }
-        }
-    }
-    return std::string_view::npos;
-}
-
 // Where the next line begins within a text that was cut off: one that is no message, or one with a
 // line's head in a text of the configuration. What commands have printed may hold anything.
 std::size_t logreader::work::findnext(const recogniser::found& found, std::string_view text)
@@ -539,67 +522,73 @@ std::size_t logreader::work::findnext(const recogniser::found& found, std::strin
         return std::string_view::npos;
     }
     const auto hashead = [&](std::string_view value) {
-        return findhead(value) != std::string_view::npos;
+        return heads.find(value) != std::string_view::npos;
     };
     const bool istorn = found.form == nullptr ||
                         (found.form->isconfigured[0] && hashead(found.what.first)) ||
                         (found.form->isconfigured[1] && hashead(found.what.second));
-    return istorn ? findhead(text) : std::string_view::npos;
+    return istorn ? heads.find(text) : std::string_view::npos;
 }
 
-void logreader::work::take(const linehead& head, const recogniser::found& found,
-                           std::string_view text, std::string_view from)
+void logreader::work::take(const saidline& said, std::string_view from)
 {
     behind = following::kStrange;
-    if (found.form == nullptr) {
-        switch (known.fragmentof(head.who, text)) {
-        case fragment::kNone:
-            ++count.foreign;
-            break;
-        case fragment::kCut:
-            ++count.torn;
-            break;
-        case fragment::kMayFollow:
-            holdunwhole(head, text, from);
-            break;
-        }
+    if (said.found.form == nullptr) {
+        takefragment(said, from);
         return;
     }
+    const pattern& form = *said.found.form;
     ++count.messages;
-    const instant when = head.who == standarderror ? count.last : moment(head.clock);
-    if (found.form->goeson) {
+    const instant when = said.who == standarderror ? count.last : moment(said.clock);
+    if (form.goeson) {
         behind = following::kGoesOn;
         writer.assign(from);
     }
-    if (!everything && !found.form->matters) {
+    if (!everything && !form.matters) {
         return;
     }
-    message said{.id = found.what.id,
-                 .level = known.speakers()[head.who].level,
-                 .thread = numberof(head.thread),
-                 .when = when,
-                 .first = found.what.first,
-                 .second = found.what.second,
-                 .text = text,
-                 .line = line};
-    if (!found.form->goeson) {
-        tell(said);
-        return;
+    const message whole = messageof(said, when);
+    if (form.goeson) {
+        hold(said, whole);
+    } else {
+        told(whole);
     }
-    isheld = true;
-    held = {.said = said, .who = head.who, .clock = head.clock, .text = std::string(text)};
 }
 
-void logreader::work::holdunwhole(const linehead& head, std::string_view text,
-                                  std::string_view from)
+// What is no message.
+void logreader::work::takefragment(const saidline& said, std::string_view from)
 {
-    behind = following::kUnwhole;
-    writer.assign(from);
+    switch (known.fragmentof(said.who, said.text)) {
+    case fragment::kNone:
+        ++count.foreign;
+        break;
+    case fragment::kCut:
+        ++count.torn;
+        break;
+    case fragment::kMayFollow:
+        behind = following::kUnwhole;
+        writer.assign(from);
+        hold(said, messageof(said, {}));
+        break;
+    }
+}
+
+message logreader::work::messageof(const saidline& said, const instant& when) const
+{
+    return {.id = said.found.what.id,
+            .level = known.speakers()[said.who].level,
+            .thread = said.thread,
+            .when = when,
+            .first = said.found.what.first,
+            .second = said.found.what.second,
+            .text = said.text,
+            .line = line};
+}
+
+void logreader::work::hold(const saidline& said, const message& whole)
+{
     isheld = true;
-    held = {.who = head.who, .clock = head.clock, .text = std::string(text)};
-    held.said.thread = numberof(head.thread);
-    held.said.level = known.speakers()[head.who].level;
-    held.said.line = line;
+    held = {.said = whole, .who = said.who, .clock = said.clock, .text = std::string(said.text)};
 }
 
 // The message that was not whole may be now.
@@ -649,7 +638,7 @@ void logreader::work::tellheld()
     held.said.text = held.text;
     held.said.more = held.more;
     isheld = false;
-    tell(held.said);
+    told(held.said);
 }
 
 instant logreader::work::moment(std::int64_t when)
@@ -688,6 +677,12 @@ void logreader::work::endfile()
     behind = following::kStrange;
 }
 
+pace pace::ofmachine() noexcept
+{
+    const unsigned processors = std::max(std::thread::hardware_concurrency(), 1U);
+    return {kBlockBytes, kSmallLogBytes, std::min(processors, kMostThreads) - 1};
+}
+
 logreader::logreader(wanted which, listener hear)
     : self(std::make_unique<work>(which, std::move(hear)))
 {
@@ -698,6 +693,11 @@ logreader::~logreader() = default;
 void logreader::feed(std::string_view bytes)
 {
     self->feed(bytes);
+}
+
+void logreader::feedall(const bytesource& read, const pace& how)
+{
+    self->feedall(read, how);
 }
 
 void logreader::pause()

@@ -12,6 +12,7 @@
 #include <string>
 #include <string_view>
 
+#include "bytesource.h"
 #include "message.h"
 
 namespace report {
@@ -34,6 +35,16 @@ enum class wanted : std::uint8_t {
     kWhatMatters, // what matters(); all else is counted only
 };
 
+// How feedall() reads.
+struct pace {
+    std::size_t blockbytes; // at once
+    std::size_t alone;      // how many bytes it reads without other threads
+    unsigned helpers;       // how many there are then
+
+    // As many threads as there are processors, within reason. Any thread.
+    [[nodiscard]] static pace ofmachine() noexcept;
+};
+
 class logreader {
 public:
     using listener = std::function<void(const message&)>;
@@ -47,6 +58,11 @@ public:
 
     // The next bytes. One thread. Messages are handed on once it is sure that they are whole.
     void feed(std::string_view bytes);
+
+    // Likewise all bytes that `read` gives. Where these are many, lines are taken apart by other
+    // threads, too: then `read` is called by any of them, by one at a time. Messages are told by
+    // this one. What `read` throws is thrown here, after the messages before.
+    void feedall(const bytesource& read, const pace& how = pace::ofmachine());
 
     // There is nothing more for now: hands on what was held back for lines that might follow it. A
     // line without its newline stays held back.

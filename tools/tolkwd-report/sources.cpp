@@ -102,13 +102,13 @@ public:
     [[nodiscard]] int number() const noexcept { return file.number(); }
     [[nodiscard]] struct stat facts() const { return factsof(file, name); }
 
-    // The next bytes; none at the end. Valid until the next call.
-    std::string_view next()
+    // The next bytes, up to so many, to `into`; returns their number, 0 at the end.
+    std::size_t read(char* into, std::size_t most)
     {
         for (;;) {
-            const ssize_t got = read(file.number(), block.data(), block.size());
+            const ssize_t got = ::read(file.number(), into, most);
             if (got >= 0) {
-                return {block.data(), static_cast<std::size_t>(got)};
+                return static_cast<std::size_t>(got);
             }
             if (errno == EAGAIN) {
                 (void)hasmore(file.number(), -1); // whoever has it, too, does not want to wait
@@ -117,6 +117,9 @@ public:
             }
         }
     }
+
+    // The next bytes; none at the end. Valid until the next call.
+    std::string_view next() { return {block.data(), read(block.data(), block.size())}; }
 
     // As many bytes as there are from `place` on, `most` of them at most. Valid until the next
     // call.
@@ -140,9 +143,7 @@ private:
 
 void readtoend(source& from, logreader& into)
 {
-    for (std::string_view bytes = from.next(); !bytes.empty(); bytes = from.next()) {
-        into.feed(bytes);
-    }
+    into.feedall([&from](char* bytes, std::size_t most) { return from.read(bytes, most); });
     into.endfile();
 }
 
