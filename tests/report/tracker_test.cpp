@@ -222,6 +222,72 @@ TEST(Check, ThatFailsAndSucceedsInARetryLeavesNoWordOfIt)
     EXPECT_EQ(told.finish("web", 400), "up 0-2, functional-failure 2-152, up* 152-400");
 }
 
+// "web" of two targets: the threads kOne and kTwo.
+std::vector<line> webtwice(const std::vector<line>& behind)
+{
+    return announced(0, kOne, "web", "/web") + announced(0, kTwo, "web", "/web") + behind;
+}
+
+TEST(TwoTargetsOfAService, DoNotEndEachOthersFailures)
+{
+    story told(webtwice({{1, kOne, kCheckBegins, "/web"},
+                         {2, kOne, kCheckFailed, "web"},
+                         {100, kTwo, kCheckBegins, "/web"},
+                         {110, kTwo, kCheckSkipped, "/web"},
+                         {120, kTwo, kCheckSucceeded},
+                         {130, kTwo, kCheckNotRecognised, "web"},
+                         {212, kOne, kFunctionalRecoveryTried, "web"},
+                         {213, kOne, kRecoveryTried, "web"},
+                         {220, kTwo, kCheckBegins, "/web"},
+                         {230, kTwo, kCheckSucceeded},
+                         {300, kOne, kCheckBegins, "/web"},
+                         {400, kOne, kFunctionallyRecovered, "web"}}));
+    EXPECT_EQ(told.finish("web", 410), "up 0-2, functional-failure 2-212, "
+                                       "functional-recovering 212-300, up* 300-410");
+    EXPECT_EQ(told.of("web").outages, 1U);
+    EXPECT_EQ(told.of("web").skippedchecks, 1U);
+}
+
+TEST(TwoTargetsOfAService, FindItUpWhenTheOneThatFailedIsSilentForLong)
+{
+    story told(webtwice({{1, kOne, kCheckBegins, "/web"},
+                         {2, kOne, kCheckFailed, "web"},
+                         {332, kTwo, kCheckBegins, "/web"}}));
+    EXPECT_THAT(told.happened({eventkind::kState}), IsEmpty());
+    told.play({{333, kTwo, kCheckBegins, "/web"}});
+    EXPECT_THAT(told.happened({eventkind::kState}), ElementsAre("152 web state up*"));
+}
+
+TEST(TwoTargetsOfAService, CountEachRecoveryOnce)
+{
+    story told(webtwice({{1, kOne, kCheckFailed, "web"},
+                         {1, kTwo, kCheckFailed, "web"},
+                         {211, kOne, kFunctionalRecoveryTried, "web"},
+                         {212, kTwo, kFunctionalRecoveryTried, "web"},
+                         {213, kOne, kRecoveryTried, "web"},
+                         {230, kTwo, kRecoveryTried, "web"},
+                         {300, kOne, kCheckBegins, "/web"},
+                         {310, kTwo, kCheckBegins, "/web"},
+                         {400, kOne, kFunctionallyRecovered, "web"},
+                         {410, kTwo, kFunctionallyRecovered, "web"}}));
+    EXPECT_EQ(told.finish("web", 500), "up 0-1, functional-failure 1-211, "
+                                       "functional-recovering 211-400, up 400-500");
+    EXPECT_EQ(told.of("web").recoveriestried, 2U);
+    EXPECT_EQ(told.of("web").outages, 1U);
+    EXPECT_THAT(told.happened({eventkind::kState}), IsEmpty());
+    EXPECT_THAT(
+        told.happened({eventkind::kRecoveryTried}),
+        ElementsAre("211 web recovery-tried functional-recovering", "212 web recovery-tried"));
+}
+
+TEST(AThreadThatIsNotAnnounced, SpeaksForItsServiceAsTheOneBefore)
+{
+    story told(web({{1, kOne, kCheckBegins, "/web"},
+                    {2, kOne, kCheckFailed, "web"},
+                    {100, kTwo, kCheckBegins, "/web"}}));
+    EXPECT_EQ(told.finish("web", 200), "up 0-2, functional-failure 2-100, up* 100-200");
+}
+
 TEST(Check, ThatKeepsFailingIsRecoveredOnceAndNotTwice)
 {
     story told(web({{1, kOne, kCheckBegins, "/web"},

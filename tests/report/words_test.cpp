@@ -100,6 +100,16 @@ TEST(Words, CountARecoveryForTheChecksSakeOnce)
               "given up after 2 recoveries; nobody watches it until the next refresh");
 }
 
+TEST(Words, CountEachRecoveryOfTwoTargetsOnce)
+{
+    story web;
+    web.said(0, messageid::kCheckFailed, state::kFunctionalFailure);
+    web.said(210, messageid::kFunctionalRecoveryTried, state::kFunctionalRecovering);
+    web.said(211, messageid::kFunctionalRecoveryTried);
+    web.said(212, messageid::kRecoveryTried);
+    EXPECT_THAT(web.said(230, messageid::kRecoveryTried), HasSubstr("recovery 2 begins"));
+}
+
 TEST(Words, DoNotCountWhatTheLogDoesNotHave)
 {
     story web;

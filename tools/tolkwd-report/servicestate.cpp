@@ -75,10 +75,9 @@ bool servicestate::tells(messageid id) noexcept
     }
 }
 
-void servicestate::hear(messageid id, const instant& when, bool steps, turns& told)
+void servicestate::hear(messageid id, const instant& when, bool steps, speaker who, turns& told)
 {
-    const bool offunctional = recoveryannounced;
-    recoveryannounced = id == messageid::kFunctionalRecoveryTried;
+    speaks = who;
     switch (id) {
     case messageid::kServiceNamed:
         return announce(when, steps, told);
@@ -93,7 +92,8 @@ void servicestate::hear(messageid id, const instant& when, bool steps, turns& to
     case messageid::kServiceUnknown:
         return fails(state::kUnknownService, when, told);
     case messageid::kRecoveryTried:
-        return triesrecovery(when, offunctional, told);
+        ++recoveriestried;
+        return troubled(state::kRecovering, when, told);
     case messageid::kRecovered:
         return recovered(when, told);
     case messageid::kGaveUp:
@@ -125,12 +125,12 @@ void servicestate::unwatch(const instant& when, bool inferred, inference why, bo
     if (!known) {
         return;
     }
+    speaks = speaker::kOwn;
     settlesilence(when, steps, told);
     if (why != inference::kDaemonEnded) {
         settle(when, told);
     }
     checkopen = false;
-    recoveryannounced = false;
     begin({state::kNotWatched, when, inferred, why, false}, told);
 }
 
@@ -230,6 +230,9 @@ void servicestate::checkbegins(const instant& when, turns& told)
     if (open == doubt::kUnchecked) {
         open = doubt::kBeingChecked;
     }
+    if (isanothers(when)) {
+        return;
+    }
     checkopen = waitsforcheck(now.what);
     checkbegan = when;
 }
@@ -237,6 +240,9 @@ void servicestate::checkbegins(const instant& when, turns& told)
 void servicestate::checksucceeds(const instant& when, turns& told)
 {
     certify(when);
+    if (isanothers(when)) {
+        return;
+    }
     checkopen = false;
     beginbymessage(state::kUp, when, told);
     open = doubt::kNone;
@@ -245,6 +251,9 @@ void servicestate::checksucceeds(const instant& when, turns& told)
 void servicestate::checkskipped(const instant& when, turns& told)
 {
     ++skippedchecks;
+    if (isanothers(when)) {
+        return;
+    }
     if (isfresh(when) && held && held->what == state::kBusy) {
         refute(when, told);
     }
@@ -269,7 +278,13 @@ void servicestate::fails(state into, const instant& when, turns& told)
 // come up by that.
 void servicestate::checkfails(state into, const instant& when, turns& told)
 {
+    if (isanothers(when)) {
+        return;
+    }
     checkopen = false;
+    if (isretried() && now.what == into && secondsbetween(failed, when) == 0) {
+        return; // the same failure, found by another target's thread
+    }
     const bool doubted = isfresh(when) || open == doubt::kUnchecked || open == doubt::kBeingChecked;
     const bool goeson = held && (held->what == into || (isoutage(held->what) && isoutage(into)));
     if (doubted && goeson) {
@@ -282,21 +297,12 @@ void servicestate::checkfails(state into, const instant& when, turns& told)
     failed = when;
 }
 
-// The functional recovery names its general part, too: that is no recovery of its own.
-void servicestate::triesrecovery(const instant& when, bool offunctional, turns& told)
-{
-    if (offunctional) {
-        return;
-    }
-    ++recoveriestried;
-    troubled(state::kRecovering, when, told);
-}
-
 // A service that is busy stays so: its check was left out.
 void servicestate::recovered(const instant& when, turns& told)
 {
     ++recoveriessuccessful;
     settle(when, told);
+    checkopen = false;
     if (!known || isoutage(now.what) || now.what == state::kNotWatched) {
         beginbymessage(state::kUp, when, told);
     }
@@ -329,6 +335,17 @@ bool servicestate::isretried() const noexcept
     return known && (now.what == state::kSuspect || now.what == state::kFunctionalFailure);
 }
 
+// Whether the check that is failing, and of which more is to be told, is another thread's.
+bool servicestate::isanothers(const instant& when) const noexcept
+{
+    if (!known || speaks == speaker::kOwn) {
+        return false;
+    }
+    return now.what == state::kFunctionalRecovering ||
+           (now.what == state::kFunctionalFailure &&
+            secondsbetween(failed, when) <= retriesseconds(now.what) + kPatienceSeconds);
+}
+
 instant servicestate::lastretry() const noexcept
 {
     const instant result = later(failed, lastretryseconds(now.what));
@@ -356,6 +373,9 @@ void servicestate::certify(const instant& when) noexcept
 // The thread speaks of something else than what was open: that has come to a good end.
 void servicestate::settle(const instant& when, turns& told)
 {
+    if (isanothers(when)) {
+        return;
+    }
     if (checkopen) {
         checkopen = false;
         begin({state::kUp, checkbegan, true, inference::kCheckHelped, false}, told);

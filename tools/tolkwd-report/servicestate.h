@@ -51,9 +51,17 @@ public:
     // Whether a message of this kind, about the service, can change its state or its figures.
     static bool tells(messageid id) noexcept;
 
-    // A message about the service, one of those that tell. `steps`: debug lines are on, so that a
-    // retry that succeeds is told. What comes of it is added to `told`.
-    void hear(messageid id, const instant& when, bool steps, turns& told);
+    // Who speaks. Several targets may name the same service; each of their threads has a check of
+    // its own, and one thread's success does not end the failure that another one has found.
+    enum class speaker : std::uint8_t {
+        kOwn,   // the thread that told of the failure, or the only one
+        kOther, // another one
+    };
+
+    // A message about the service, one of those that tell; the general part of a functional
+    // recovery is not one. `steps`: debug lines are on, so that a retry that succeeds is told. What
+    // comes of it is added to `told`.
+    void hear(messageid id, const instant& when, bool steps, speaker who, turns& told);
 
     // No thread watches the service from `when` on. Unless the daemon has ended, which may be at
     // any moment, its thread had come to the end of its round first.
@@ -90,13 +98,13 @@ private:
     void checkskipped(const instant& when, turns& told);
     void fails(state into, const instant& when, turns& told);
     void checkfails(state into, const instant& when, turns& told);
-    void triesrecovery(const instant& when, bool offunctional, turns& told);
     void recovered(const instant& when, turns& told);
     void givesup(const instant& when, turns& told);
     void troubled(state into, const instant& when, turns& told);
 
     [[nodiscard]] bool isfresh(const instant& when) const noexcept;
     [[nodiscard]] bool isretried() const noexcept;
+    [[nodiscard]] bool isanothers(const instant& when) const noexcept;
     [[nodiscard]] instant lastretry() const noexcept;
     void certify(const instant& when) noexcept;
     void settle(const instant& when, turns& told);
@@ -109,7 +117,7 @@ private:
 
     bool known = false;
     bool checkopen = false;         // a check was begun in a state that only its result ends
-    bool recoveryannounced = false; // a functional recovery: its general part is to be named yet
+    speaker speaks = speaker::kOwn; // the message that is being heard
     bool retold = false;            // the beginning that was told last has been refuted
     doubt open = doubt::kNone;
     span now;

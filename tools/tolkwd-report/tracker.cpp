@@ -202,8 +202,13 @@ public:
 private:
     struct watched {
         servicestate course;
-        std::uint32_t seen = 0;   // the generation in which it was heard of last
-        bool pathexpected = true; // its path, if one is known, is of a former generation
+        std::uint32_t announcedin = 0;  // the generation in which it was announced last
+        std::uint32_t monitors = 0;     // how often it was, in that
+        std::uint64_t failing = 0;      // the thread that told of the last failure; 0: none yet
+        std::vector<std::uint64_t> due; // threads whose functional recovery has its stops and
+                                        // starts to come
+        std::uint32_t seen = 0;         // the generation in which it was heard of last
+        bool pathexpected = true;       // its path, if one is known, is of a former generation
     };
 
     // An announcement that may belong to a service of which the path is known already: the next
@@ -227,6 +232,8 @@ private:
     void nothingloaded(const message& said);
     void daemonended(const message& said);
     void statetold(const std::optional<serviceid>& service, const message& said);
+    static bool continuesrecovery(watched& one, const message& said);
+    static servicestate::speaker speakerof(watched& one, const message& said);
 
     [[nodiscard]] std::optional<serviceid> speaker(std::uint64_t thread) const noexcept;
     std::optional<serviceid> named(std::uint64_t thread, std::string_view name, bool whole);
@@ -376,8 +383,14 @@ void tracker::work::begingeneration(generations::start how)
 void tracker::work::watch(serviceid service, std::uint64_t thread, const instant& when)
 {
     tied(thread, service);
-    services[service].pathexpected = true;
-    services[service].course.hear(messageid::kServiceNamed, when, generation.hassteps(), told);
+    watched& one = services[service];
+    one.pathexpected = true;
+    one.monitors = one.announcedin == generation.number() ? one.monitors + 1 : 1;
+    one.announcedin = generation.number();
+    one.failing = 0;
+    one.due.clear();
+    one.course.hear(messageid::kServiceNamed, when, generation.hassteps(),
+                    servicestate::speaker::kOwn, told);
 }
 
 // `said`: the next message of whatever thread; null at the end.
@@ -432,7 +445,8 @@ void tracker::work::threadleft(const message& said)
     const std::optional<serviceid> service = speaker(said.thread);
     who.untie(said.thread);
     if (service && who.watchers(*service, generation.number()) == 0) {
-        services[*service].course.hear(said.id, last, generation.hassteps(), told);
+        services[*service].course.hear(said.id, last, generation.hassteps(),
+                                       servicestate::speaker::kOwn, told);
         tellturns(*service);
     }
     tell(service, said, kindof(said.id));
@@ -459,12 +473,45 @@ void tracker::work::statetold(const std::optional<serviceid>& service, const mes
     if (service && servicestate::tells(said.id)) {
         watched& one = services[*service];
         one.seen = generation.number();
-        one.course.hear(said.id, last, generation.hassteps(), told);
-        again = said.id == messageid::kRecoveryTried &&
-                one.course.current() == state::kFunctionalRecovering;
-        tellturns(*service);
+        again = continuesrecovery(one, said);
+        if (!again) {
+            one.course.hear(said.id, last, generation.hassteps(), speakerof(one, said), told);
+            tellturns(*service);
+        }
     }
     tell(service, said, again ? eventkind::kStep : kindof(said.id)); // a recovery is told once
+}
+
+// The functional recovery names its general part, too: that is no recovery of its own. Between the
+// two its thread says nothing else, but other threads may.
+bool tracker::work::continuesrecovery(watched& one, const message& said)
+{
+    constexpr std::size_t kMostDue = 4; // a part that is lost is waited for no longer than that
+    const bool wasdue = std::erase(one.due, said.thread) != 0;
+    if (said.id == messageid::kFunctionalRecoveryTried) {
+        if (one.due.size() == kMostDue) {
+            one.due.erase(one.due.begin());
+        }
+        one.due.push_back(said.thread);
+    }
+    return wasdue && said.id == messageid::kRecoveryTried;
+}
+
+servicestate::speaker tracker::work::speakerof(watched& one, const message& said)
+{
+    switch (said.id) {
+    case messageid::kServiceFailed:
+    case messageid::kCheckFailed:
+    case messageid::kFunctionalRecoveryTried:
+    case messageid::kRecoveryTried:
+        one.failing = said.thread;
+        break;
+    default:
+        break;
+    }
+    const bool several = one.monitors > 1 && one.failing != 0;
+    return several && one.failing != said.thread ? servicestate::speaker::kOther
+                                                 : servicestate::speaker::kOwn;
 }
 
 std::optional<serviceid> tracker::work::speaker(std::uint64_t thread) const noexcept

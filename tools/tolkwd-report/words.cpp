@@ -264,10 +264,11 @@ void countrecovery(messageid id, tale& past)
 {
     if (id == messageid::kFunctionalRecoveryTried) {
         ++past.recoveries;
-        past.recoverydue = true;
+        ++past.recoveriesdue;
+    } else if (id == messageid::kRecoveryTried && past.recoveriesdue > 0) {
+        --past.recoveriesdue;
     } else if (id == messageid::kRecoveryTried) {
-        past.recoveries += past.recoverydue ? 0 : 1;
-        past.recoverydue = false;
+        ++past.recoveries;
     }
 }
 

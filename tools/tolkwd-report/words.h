@@ -14,9 +14,9 @@ namespace report {
 struct tale {
     std::optional<instant> outage{}; // since when it lasts
     bool whole = false;              // the log has that outage from its first failure on
-    bool recoverydue = false;        // its check has asked for one that has not begun yet
     bool fresh = false;              // its thread has said nothing but whom it watches
     std::uint64_t recoveries = 0;    // in this outage
+    std::uint64_t recoveriesdue = 0; // its check has asked for them, and they have not begun yet
     std::optional<instant> before{}; // since when the outage had lasted before the announcement
     instant announced{};             // that took it to be over
 };
