@@ -605,6 +605,23 @@ TEST(Generation, AfterALongSilenceOfDebugLinesWasNotWatchedMeanwhile)
     EXPECT_EQ(told.finish("web", 9100), "up 0-61, not-watched* 61-9001, up 9001-9100");
 }
 
+TEST(Generation, AfterALongSilenceFindsWhomTheDaemonHadGivenUpAsItLeftThem)
+{
+    story told(std::vector<line>{{0, kOne, kThreadEntered}} + web({}) +
+               announced(0, kTwo, "db", "/db") +
+               std::vector<line>{{1, kOne, kPingSucceeded},
+                                 {61, kOne, kServiceFailed, "web"},
+                                 {61, kTwo, kServiceUnknown, "db"},
+                                 {271, kOne, kRecoveryTried, "web"},
+                                 {331, kOne, kGaveUp, "web"},
+                                 {9001, kOne, kThreadEntered}} +
+               announced(9001, kOne, "web", "/web") + announced(9001, kTwo, "db", "/db") +
+               std::vector<line>{{9002, kOne, kPingSucceeded}, {9002, kTwo, kPingSucceeded}});
+    EXPECT_EQ(told.finish("web", 9100),
+              "up 0-61, suspect 61-271, recovering 271-331, gave-up 331-9001, up 9001-9100");
+    EXPECT_EQ(told.spansof("db"), "up* 0-61, unknown-service 61-9001, up 9001-9100");
+}
+
 TEST(Load, ThatFailsLeavesNothingWatchedUntilTheNextAnnouncement)
 {
     for (const auto failed : {kLoadFailed, kConfigurationUnreadable}) {

@@ -246,6 +246,7 @@ private:
 
     void unwatch(serviceid service, const instant& when, bool inferred, inference why);
     void unwatchall(const instant& when, bool inferred, inference why);
+    void unwatchsilent();
     void leaveout();
     void conclude(serviceid service, const instant& when, bool final);
 
@@ -374,7 +375,7 @@ void tracker::work::begingeneration(generations::start how)
         tellofall(eventkind::kConfiguration, inference::kWatchedAnew);
     } else if (how == generations::start::kAnew) {
         if (silentto != instant{} && secondsbetween(silentto, last) <= kStartSeconds) {
-            unwatchall(silentfrom, true, inference::kDaemonEnded);
+            unwatchsilent();
         }
         tellofall(eventkind::kDaemon, inference::kStartedAnew);
     }
@@ -615,6 +616,18 @@ void tracker::work::unwatchall(const instant& when, bool inferred, inference why
 {
     for (serviceid service = 0; service < services.size(); ++service) {
         unwatch(service, when, inferred, why);
+    }
+}
+
+// The daemon had ended when all fell silent. A service without a thread had been silent before, and
+// what became of it does not depend on the daemon.
+void tracker::work::unwatchsilent()
+{
+    for (serviceid service = 0; service < services.size(); ++service) {
+        const state before = services[service].course.current();
+        if (before != state::kGaveUp && before != state::kUnknownService) {
+            unwatch(service, silentfrom, true, inference::kDaemonEnded);
+        }
     }
 }
 
