@@ -170,7 +170,8 @@ STATUS = {
     "services": [{
         "service": TEXT, "state": STATES, "inferred": bool, "since": TIME, "seconds": int,
         "path": (*TEXT, NOTHING),
-        "lastoutage": ({"from": TIME, "to": (TIME, NOTHING), "seconds": int}, NOTHING),
+        "lastoutage": ({"from": TIME, "to": (TIME, NOTHING), "seconds": int,
+                        "inferred": bool}, NOTHING),
         "outages": int, "outageseconds": int, "recoveries": {"tried": int, "successful": int},
         "skippedchecks": int, "gaveup": int, "watchedseconds": int,
         "availability": (float, int, NOTHING)}],
@@ -226,7 +227,8 @@ def test_json_tells_what_the_table_tells(run):
     assert (web["service"], web["state"], web["since"]) == ("web", "gave-up", "2026-11-21T15:05:30")
     assert (web["path"], web["gaveup"]) == ("/usr/sbin/webd", 1)
     assert web["recoveries"] == {"tried": 1, "successful": 0}
-    assert web["lastoutage"] == {"from": "2026-11-21T15:01:00", "to": None, "seconds": 270}
+    assert web["lastoutage"] == {"from": "2026-11-21T15:01:00", "to": None, "seconds": 270,
+                                 "inferred": False}
     assert web["watchedseconds"] == 330
     assert web["availability"] == pytest.approx(1 - 270 / 330)
     assert (database["state"], database["outages"], database["lastoutage"]) == ("up", 0, None)

@@ -40,7 +40,7 @@ account eventful(const std::string& name, state now)
 {
     account result = service(name, now, 400 * kDay);
     result.now.inferred = true;
-    result.lastoutage = outage{ago(99 * kDay), std::nullopt};
+    result.lastoutage = outage{.from = ago(99 * kDay)};
     result.outages = 987654321;
     result.recoveriestried = 99999;
     result.recoveriessuccessful = 9999;
@@ -104,7 +104,7 @@ TEST(Status, TellsTroubleFirst)
 TEST(Status, TellsEachFigure)
 {
     account web = service("web", state::kUp, 600);
-    web.lastoutage = outage{ago(912), ago(600)};
+    web.lastoutage = outage{.from = ago(912), .to = ago(600)};
     web.outages = 2;
     web.recoveriestried = 3;
     web.recoveriessuccessful = 1;
@@ -124,12 +124,22 @@ TEST(Status, MarksWhatIsInferredAndAnOutageThatLasts)
 {
     account web = service("web", state::kSuspect, 61);
     web.now.inferred = true;
-    web.lastoutage = outage{ago(61), std::nullopt};
+    web.lastoutage = outage{.from = ago(61)};
     const auto lines = linesof(seen({web}));
     EXPECT_THAT(lines.at(1), HasSubstr(" ~15:38 "));
     EXPECT_THAT(lines.at(1), HasSubstr(" >1m01s "));
     EXPECT_EQ(lines.back(), "~ inferred: no message says so, or when");
     EXPECT_THAT(textof(seen({service("web")})), Not(HasSubstr("~")));
+}
+
+TEST(Status, MarksTheLengthOfAnOutageOfWhichTheEndIsInferred)
+{
+    account web = service("web", state::kBusy, 60);
+    web.lastoutage = outage{ago(912), ago(600), true};
+    const auto lines = linesof(seen({web}));
+    EXPECT_THAT(lines.at(1), HasSubstr(" 15:24  ~5m12s "));
+    EXPECT_EQ(lines.back(), "~ inferred: no message says so, or when");
+    EXPECT_THAT(linesof(seen({web}), 200).at(1), HasSubstr(" ~5 min 12 s "));
 }
 
 TEST(Status, TellsATimeByAsMuchAsItTakes)

@@ -137,6 +137,7 @@ TEST(Failure, IsFollowedByARecoveryThatHelps)
     EXPECT_EQ(web.recoveriessuccessful, 1U);
     EXPECT_EQ(web.outages, 1U);
     EXPECT_EQ(web.lastoutage->from, at(60));
+    EXPECT_FALSE(web.lastoutage->inferred);
     EXPECT_EQ(web.lastoutage->to, at(335));
     EXPECT_EQ(web.outageseconds, 275);
     EXPECT_EQ(web.watchedseconds, 400);
@@ -171,6 +172,7 @@ TEST(Failure, IsOverWhenSilenceHasOutlastedTheRetries)
     story told(web({{60, kOne, kServiceFailed, "web"}}));
     EXPECT_EQ(told.now("web", 60 + 210 + 120), "suspect 60-");
     EXPECT_EQ(told.now("web", 60 + 210 + 121), "up* 270-");
+    EXPECT_TRUE(told.of("web").lastoutage->inferred);
     EXPECT_EQ(told.of("web").lastoutage->to, at(270));
     EXPECT_EQ(told.finish("web", 1000), "up* 0-60, suspect 60-270, up* 270-1000");
 }

@@ -33,7 +33,8 @@ ordered_json outagejson(const outage& last, const instant& judged)
 {
     return {{"from", isotext(last.from)},
             {"to", last.to ? ordered_json(isotext(*last.to)) : ordered_json()},
-            {"seconds", secondsbetween(last.from, last.to.value_or(judged))}};
+            {"seconds", secondsbetween(last.from, last.to.value_or(judged))},
+            {"inferred", last.inferred}};
 }
 
 ordered_json servicejson(const account& service, const instant& judged)

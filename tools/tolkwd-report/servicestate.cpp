@@ -464,10 +464,11 @@ void servicestate::count(const span& over)
         outageseconds += seconds;
         if (!wasoutage) {
             ++outages;
-            lastoutage = outage{over.from, std::nullopt};
+            lastoutage = outage{.from = over.from};
         }
     } else if (wasoutage) {
         lastoutage->to = over.from;
+        lastoutage->inferred = over.inferred;
     }
     wasoutage = isnow;
 }

@@ -268,7 +268,7 @@ private:
         return how.fulltimes ? clocktext(when) : shorttime(when, seen.judged);
     }
 
-    // When it began and how long it took; one that lasts has taken longer than that.
+    // When it began and how long it took, maybe by inference; one that lasts has taken longer.
     [[nodiscard]] std::string lastoutage(const account& service) const
     {
         if (!service.lastoutage) {
@@ -278,7 +278,9 @@ private:
         const std::int64_t seconds = secondsbetween(last.from, last.to.value_or(seen.judged));
         const std::size_t width = how.fulltimes ? 14 : 7; // ">59 min 59 s", ">59m59s"
         return timetext(last.from) + ' ' +
-               filledbefore((last.to ? "" : ">") +
+               filledbefore((!last.to        ? ">"
+                             : last.inferred ? "~"
+                                             : "") +
                                 (how.fulltimes ? spantext(seconds) : shortspan(seconds)),
                             width);
     }
@@ -406,7 +408,7 @@ std::string_view standstill(const overview& seen) noexcept
 void writecautions(std::ostream& out, const overview& seen)
 {
     const auto inferred = [](const account& each) {
-        return each.now.inferred;
+        return each.now.inferred || (each.lastoutage && each.lastoutage->inferred);
     };
     if (std::any_of(seen.services.begin(), seen.services.end(), inferred)) {
         out << "~ inferred: no message says so, or when\n";

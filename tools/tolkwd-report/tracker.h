@@ -39,7 +39,8 @@ struct span {
 // longer watched.
 struct outage {
     instant from;
-    std::optional<instant> to; // none: it lasts
+    std::optional<instant> to{}; // none: it lasts
+    bool inferred = false;       // no message says that it ended, or when
 };
 
 // All that is known of one service, in constant memory. Times in seconds.

@@ -47,7 +47,7 @@ public:
         begun = true;
         account& figures = self().figures;
         if (isoutage(what) && (!figures.lastoutage || figures.lastoutage->to)) {
-            figures.lastoutage = outage{at(seconds, clockset), std::nullopt};
+            figures.lastoutage = outage{.from = at(seconds, clockset)};
             ++figures.outages;
         }
         if (!isoutage(what) && figures.lastoutage && !figures.lastoutage->to) {
