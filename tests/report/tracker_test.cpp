@@ -282,6 +282,19 @@ TEST(TwoTargetsOfAService, CountEachRecoveryOnce)
         ElementsAre("211 web recovery-tried functional-recovering", "212 web recovery-tried"));
 }
 
+TEST(AName, WithANewlineIsKnownByItsFirstLine)
+{
+    story told(
+        announced(0, kOne, "web", "/bin/web") +
+        std::vector<line>{{1, kOne, kCheckBegins, "/bin/web\n-x"},
+                          {60, kOne, kServiceFailed, "web\nserver"},
+                          {61, kOne, kStatusAnswered, "service web\nserver status 1>/f 2>/f"},
+                          {270, kOne, kRecoveryTried, "web"},
+                          {400, kOne, kRecovered, "web\nserver"}});
+    EXPECT_EQ(told.finish("web", 500), "up 0-60, suspect 60-270, recovering 270-400, up 400-500");
+    EXPECT_THAT(told.names(), ElementsAre("web"));
+}
+
 TEST(AThreadThatIsNotAnnounced, SpeaksForItsServiceAsTheOneBefore)
 {
     story told(web({{1, kOne, kCheckBegins, "/web"},

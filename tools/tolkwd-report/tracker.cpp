@@ -129,6 +129,13 @@ eventkind kindof(messageid id) noexcept
     }
 }
 
+// A name or path may hold a newline. Where the message ends with it the log has it up to there
+// only, so that is what it is known by.
+std::string_view firstline(std::string_view text) noexcept
+{
+    return text.substr(0, text.find('\n'));
+}
+
 // The name in "service NAME status 1>FILE 2>FILE"; none in anything else.
 std::optional<std::string_view> nameincommand(std::string_view command) noexcept
 {
@@ -286,11 +293,11 @@ void tracker::work::hear(const message& said)
     case role::kLeaves:
         return threadleft(said);
     case role::kNames:
-        return statetold(named(said.thread, said.first, true), said);
+        return statetold(named(said.thread, firstline(said.first), true), said);
     case role::kEndsNamed:
         return statetold(named(said.thread, said.first, false), said);
     case role::kPath:
-        return statetold(pathed(said.thread, said.first), said);
+        return statetold(pathed(said.thread, firstline(said.first)), said);
     case role::kCommand:
         return tell(commanded(said.thread, said.first), said, kindof(said.id));
     case role::kNoLoad:
@@ -548,7 +555,7 @@ std::optional<serviceid> tracker::work::named(std::uint64_t thread, std::string_
 std::optional<serviceid> tracker::work::commanded(std::uint64_t thread, std::string_view command)
 {
     const std::optional<std::string_view> name = nameincommand(command);
-    return name ? named(thread, *name, true) : speaker(thread);
+    return name ? named(thread, firstline(*name), true) : speaker(thread);
 }
 
 // Another path than that of the thread's service tells the same. A path that nobody is known to
