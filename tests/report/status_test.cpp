@@ -248,6 +248,17 @@ TEST(Status, OfAFailedLoadAsksForALook)
     EXPECT_THAT(textof(all), StartsWith("the configuration could not be loaded"));
 }
 
+TEST(Status, AsOfAPresentBeforeTheLastLineAsksForTheZone)
+{
+    overview all = seen({service("web")});
+    all.asofnow = true;
+    all.judged = all.present = {.clock = kEnd - 3600, .elapsed = kEnd};
+    EXPECT_THAT(textof(all), HasSubstr("\njudged as of 2026-11-21 14:39:37, before the last line: "
+                                       "is TZ that of the daemon?\n"));
+    all.judged.elapsed += 60; // in the hour that comes twice
+    EXPECT_THAT(textof(all), HasSubstr("\njudged as of 2026-11-21 14:39:37, 1 min after the last"));
+}
+
 TEST(Status, WhereNothingIsWatchedAsksForALook)
 {
     const overview all =

@@ -330,6 +330,16 @@ std::string oddwords(const readcount& count)
     return fmt::format("{}", fmt::join(words, ", "));
 }
 
+// How far the log's last line is from the present by which it is judged. A last line of a time to
+// come, which counts as the present then, is mostly one of another zone.
+std::string distancetolog(const overview& seen)
+{
+    const std::int64_t seconds = secondsbetween(seen.count.last, seen.judged);
+    return seconds <= 0 && seen.judged.clock < seen.count.last.clock
+               ? "before the last line: is TZ that of the daemon?"
+               : spantext(seconds) + " after the last line";
+}
+
 void writesources(std::ostream& out, const overview& seen)
 {
     const readcount& count = seen.count;
@@ -352,8 +362,7 @@ void writesources(std::ostream& out, const overview& seen)
             << ": times above may repeat\n";
     }
     if (seen.asofnow) {
-        out << fmt::format("judged as of {}, {} after the last line\n", clocktext(seen.judged),
-                           spantext(secondsbetween(count.last, seen.judged)));
+        out << fmt::format("judged as of {}, {}\n", clocktext(seen.judged), distancetolog(seen));
     }
 }
 
