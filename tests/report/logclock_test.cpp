@@ -62,6 +62,15 @@ TEST(LogClock, KnowsChangesWithinAnHour)
     EXPECT_EQ(clock.changes(), 0U);
 }
 
+TEST(LogClock, KnowsHoursOfWhichHalfIsLeftOut)
+{
+    logclock clock = clockin(kHalfHour);
+    const auto before = elapsed(clock, "Sun Oct  4 01:59:59 2026");
+    EXPECT_EQ(elapsed(clock, "Sun Oct  4 02:30:00 2026") - before, 1);
+    EXPECT_EQ(elapsed(clock, "Sun Oct  4 02:59:59 2026") - before, 1800);
+    EXPECT_EQ(elapsed(clock, "Sun Oct  4 03:00:00 2026") - before, 1801);
+}
+
 TEST(LogClock, TakesATimeThatWasLeftOutForALaterOne)
 {
     logclock clock = clockin(kBerlin);

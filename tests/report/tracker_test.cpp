@@ -106,6 +106,13 @@ TEST(Announcement, CutsRetriesShortSoThatTheFirstWordTells)
     EXPECT_EQ(running.finish("web", 100), "up* 0-60, suspect 60-80, up 80-100");
 }
 
+TEST(Announcement, BehindTheLastRetryLeavesInferredWhatTheRetryDid)
+{
+    story told(web({{60, kOne, kServiceFailed, "web"}}) + announced(300, kTwo, "web", "/web") +
+               std::vector<line>{{301, kTwo, kCheckBegins, "/web"}});
+    EXPECT_EQ(told.finish("web", 400), "up* 0-60, suspect 60-270, up* 270-400");
+}
+
 TEST(Announcement, DuringAFunctionalRecoveryLeavesTheCheckToTell)
 {
     const auto restarted = web({{10, kOne, kCheckBegins, "/web"},
@@ -391,6 +398,17 @@ TEST(Check, WithoutItsCommandIsNoOutage)
     EXPECT_EQ(told.of("web").lastoutage, std::nullopt);
 }
 
+TEST(Check, WithoutItsCommandDoesNotGoOnWithAnOutage)
+{
+    story told(web({{60, kOne, kServiceFailed, "web"},
+                    {270, kOne, kRecoveryTried, "web"},
+                    {330, kOne, kCheckBegins, "/web"},
+                    {340, kOne, kCheckNotRecognised, "web"}}));
+    EXPECT_EQ(told.finish("web", 350), "up* 0-60, suspect 60-270, recovering 270-330, up 330-340, "
+                                       "command-not-recognised 340-350");
+    EXPECT_EQ(told.of("web").lastoutage->to, at(330));
+}
+
 TEST(Check, ThatIsSkippedMeansBusy)
 {
     story told(web({{1, kOne, kCheckSkipped, "/web"},
@@ -533,6 +551,13 @@ TEST(Threads, WhoseIdWasUsedAgainUnnoticedAreFoundByTheNameTheySay)
     EXPECT_EQ(told.now("news", 9300), "up* 9211-");
 }
 
+TEST(Threads, KeepTheirServiceWhereItsNameMayBeCut)
+{
+    story told(web({{60, kOne, kServiceFailed, "web"}, {270, kOne, kRecoveryTried, "we"}}));
+    EXPECT_EQ(told.finish("web", 280), "up* 0-60, suspect 60-270, recovering 270-280");
+    EXPECT_THAT(told.names(), ElementsAre("web"));
+}
+
 TEST(Threads, OfAFormerMonitorMayBeTheMainThreadsNow)
 {
     story told(web({{500, kOne, kRefreshBegins}, {500, kOne, kLoadFailed}}));
@@ -620,21 +645,29 @@ TEST(Generation, AfterALongSilenceOfDebugLinesWasNotWatchedMeanwhile)
     EXPECT_EQ(told.finish("web", 9100), "up 0-61, not-watched* 61-9001, up 9001-9100");
 }
 
-TEST(Generation, AfterALongSilenceFindsWhomTheDaemonHadGivenUpAsItLeftThem)
+TEST(Generation, OfAnotherServiceAloneLeavesOutTheOneBefore)
 {
-    story told(std::vector<line>{{0, kOne, kThreadEntered}} + web({}) +
-               announced(0, kTwo, "db", "/db") +
-               std::vector<line>{{1, kOne, kPingSucceeded},
-                                 {61, kOne, kServiceFailed, "web"},
-                                 {61, kTwo, kServiceUnknown, "db"},
-                                 {271, kOne, kRecoveryTried, "web"},
-                                 {331, kOne, kGaveUp, "web"},
-                                 {9001, kOne, kThreadEntered}} +
-               announced(9001, kOne, "web", "/web") + announced(9001, kTwo, "db", "/db") +
-               std::vector<line>{{9002, kOne, kPingSucceeded}, {9002, kTwo, kPingSucceeded}});
-    EXPECT_EQ(told.finish("web", 9100),
-              "up 0-61, suspect 61-271, recovering 271-331, gave-up 331-9001, up 9001-9100");
-    EXPECT_EQ(told.spansof("db"), "up* 0-61, unknown-service 61-9001, up 9001-9100");
+    story told(web({}) + announced(7200, kTwo, "mail", "/mail"));
+    EXPECT_EQ(told.now("web", 7300), "not-watched* 7200-");
+    EXPECT_EQ(told.now("mail", 7300), "up* 7200-");
+}
+
+TEST(Generation, OfANewDaemonMayBeOneWithoutDebugLines)
+{
+    story told(std::vector<line>{{0, kOne, kThreadEntered}} + web({{1, kOne, kPingSucceeded}}) +
+               announced(90, kTwo, "web", "/web") +
+               std::vector<line>{{150, kTwo, kServiceFailed, "web"}});
+    EXPECT_EQ(told.finish("web", 600), "up 0-150, suspect 150-360, up* 360-600");
+}
+
+TEST(Generation, LongAfterASilenceOfDebugLinesWasWatchedMeanwhile)
+{
+    story told(std::vector<line>{{0, kOne, kThreadEntered}} +
+               web({{1, kOne, kPingSucceeded}, {900, kOne, kPingSucceeded}}) +
+               std::vector<line>{{1000, kTwo, kThreadEntered}} +
+               announced(1000, kTwo, "web", "/web"));
+    EXPECT_THAT(told.happened({eventkind::kDaemon}), ElementsAre("1000 - daemon*"));
+    EXPECT_EQ(told.finish("web", 1100), "up 0-1100");
 }
 
 TEST(Load, ThatFailsLeavesNothingWatchedUntilTheNextAnnouncement)
@@ -661,6 +694,20 @@ TEST(Daemon, ThatEndsLeavesNothingWatched)
     }
 }
 
+TEST(Daemon, ThatEndsAmidRetriesHasNotSeenThemSucceed)
+{
+    story told(web({{60, kOne, kServiceFailed, "web"}, {300, 0, kNoLog}}));
+    EXPECT_EQ(told.finish("web", 350), "up* 0-60, suspect 60-300, not-watched 300-350");
+}
+
+TEST(Daemon, ThatHasEndedIsStartedAnew)
+{
+    story told(web({{100, 0, kNoLog}}) + announced(200, kTwo, "web", "/web"));
+    EXPECT_THAT(told.happened({eventkind::kDaemon, eventkind::kConfiguration}),
+                ElementsAre("100 - daemon", "200 - daemon*"));
+    EXPECT_EQ(told.finish("web", 300), "up* 0-100, not-watched 100-200, up* 200-300");
+}
+
 TEST(Clock, ThatIsSetIsToldAndReckonedWithout)
 {
     story told;
@@ -682,6 +729,15 @@ TEST(Clock, ThatIsSetIsTheOneByWhichWhatIsInferredLaterIsDated)
     told.finish("web", 1001);
     EXPECT_EQ(told.of("web").now.from, (report::instant{13810, 210}));
     EXPECT_EQ(told.of("mail").now.from, (report::instant{13720, 120}));
+}
+
+TEST(Clock, IsNotSetByALineWithoutATime)
+{
+    story told;
+    told.hear({0, 0, kConfigurationUnreadable}, {});
+    told.play(web({}));
+    EXPECT_THAT(told.happened({eventkind::kDaemon}), IsEmpty());
+    EXPECT_EQ(told.finish("web", 10), "up* 0-10");
 }
 
 TEST(Clock, OfLinesThatStandOutOfOrderDoesNotGoBack)
