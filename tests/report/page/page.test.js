@@ -210,6 +210,16 @@ test('the wheel beside the lines scrolls the page', async () => {
     });
 });
 
+test('the wheel scrolls the page where zooming out has come to its end', async () => {
+    await open('crowd', async (page) => {
+        const place = await pointon(page, 0.5);
+        await page.mouse.move(place.x, place.y);
+        await page.mouse.wheel(0, 300);
+        await page.waitForFunction(() => window.scrollY >= 200);
+        assert.ok((await shown(page)).whole);
+    });
+});
+
 test('buttons zoom and pan', async () => {
     await open('week', async (page) => {
         for (const id of ['#out', '#all', '#back', '#forth']) {
@@ -462,6 +472,27 @@ test('keys zoom and pan', async () => {
     });
 });
 
+test('the keys of the browser itself are left to it', async () => {
+    await open('week', async (page) => {
+        await page.locator('#lines').focus();
+        await page.keyboard.press('+');
+        const half = await shown(page);
+        await page.evaluate(() => {
+            window.taken = [];
+            window.addEventListener('keydown', ({key, defaultPrevented}) => {
+                window.taken.push(`${key} ${defaultPrevented}`);
+            });
+        });
+        for (const key of ['Control+0', 'Control+-', 'Alt+0', 'Meta+0']) {
+            await page.keyboard.press(key);
+        }
+        assert.deepEqual(await shown(page), half);
+        assert.deepEqual(await page.evaluate(() =>
+            window.taken.filter((key) => !/^(Control|Alt|Meta) /.test(key))),
+        ['0 false', '- false', '0 false', '0 false']);
+    });
+});
+
 test('a state out of sight comes into sight when it is chosen', async () => {
     await open('crowd', async (page) => {
         await page.locator('#lines').focus();
@@ -562,6 +593,15 @@ test('the table has the figures', async () => {
         ]);
         assert.equal(await page.textContent('#headline'), '3 of 10 services in trouble');
         assert.match(await page.textContent('#counts'), /48,123 lines read/);
+    });
+});
+
+test('an availability is rounded down', async () => {
+    await open('week', async (page) => {
+        const share = async (service) => page.locator('tbody tr', {hasText: service})
+            .locator('td[data-title="Availability"]').textContent();
+        assert.equal(await share('nginx'), '99.86\u00a0%'); // 99.8677
+        assert.equal(await share('ssh'), '100\u00a0%');
     });
 });
 
