@@ -150,6 +150,13 @@ TEST(Page, ASpanHasTheClockOnlyWhereItWasSet)
               json::parse("[[0,0,0,20],[1,0,20,40,20,-3560],[0,0,40,60,-3560,-3540]]"));
 }
 
+TEST(Page, ASpanHasTheClockAlsoWhereItWasSetRightAgain)
+{
+    pagecontents contents = withservice("web");
+    contents.services[0].spans = {{state::kBusy, later(20, -3600), later(40), false}};
+    EXPECT_EQ(data(contents)["services"][0]["spans"], json::parse("[[1,0,20,40,-3580,40]]"));
+}
+
 TEST(Page, AServiceWithoutASpanIsDrawnAsWhatItIs)
 {
     pagecontents contents = withservice("web");
