@@ -1,5 +1,5 @@
 #!/usr/bin/python3
-"""Breaks the daemon and its checker on purpose, one behaviour at a time, and shows that their tests
+"""Breaks the daemon and its tools on purpose, one behaviour at a time, and shows that their tests
 notice.
 
 mutants.toml lists the mutants; each replaces one piece of one source file and names the promise
@@ -37,13 +37,28 @@ CONFIGURE = ["cmake", "--preset", "debug", "-DBUILD_TESTING=ON", "-DCMAKE_CXX_FL
 
 # Each kind of tests, and how long all of them may take together. A mutant that hangs is caught by
 # this bound; one that never stops growing is caught by the other.
-TEST_SECONDS = {"unit": 60, "system": 600, "check": 300}
+TEST_SECONDS = {"unit": 60, "system": 600, "check": 300, "report": 600, "page": 600}
 TEST_MEMORY_BYTES = 4 << 30
 
-# Which tests are for the files of a folder, the quick ones first.
-KINDS = {"src": ("unit", "system"), "tools": ("check",)}
+# Which tests are for the files of a folder, the quick ones first. Of two folders that hold a file
+# the first one counts.
+KINDS = {"src": ("unit", "system"), "tools/tolkwd-report/page": ("page",),
+         "tools/tolkwd-report": ("report",), "tools": ("check",)}
 
-FAILED_TEST = re.compile(r"Test +#\d+: (\S+) .*\*\*\*")
+# How ctest is asked for the tests of a kind, where its label is not enough: a browser is started
+# for what only it can tell.
+IN_A_BROWSER = r"^report\.page(\.install|\.check\..*)?$"
+SELECTIONS = {"report": ["-L", "^report$", "-E", IN_A_BROWSER], "page": ["-R", IN_A_BROWSER, "-V"]}
+
+# Of these one test is a whole machine or a browser, and a busy machine can fail it, too.
+UNSTEADY = ("system", "page")
+
+# Modules whose tests have another's name.
+TESTED_WITH = {"generations": "tracker", "servicestate": "tracker"}
+
+# As ctest says it, or within the tests in a browser their runner, in either of its forms.
+FAILED_TEST = re.compile(r"Test +#\d+: (?P<test>\S+) .*\*\*\*|"
+                         r"^\d+: +(?:not ok \d+ - |\u2716 )(?P<part>.*)")
 TIME_OUT = "time-out"
 
 KEYS = {"name", "breaks", "file", "before", "after"}
@@ -83,8 +98,16 @@ def select(mutants, names, folder):
     unknown = set(names) - {mutant["name"] for mutant in mutants}
     if unknown:
         raise Fault(f"no such mutant: {', '.join(sorted(unknown))}")
-    return [mutant for mutant in mutants if mutant["file"].startswith(folder) and
-            (not names or mutant["name"] in names)]
+    selected = [mutant for mutant in mutants if isin(mutant["file"], folder) and
+                (not names or mutant["name"] in names)]
+    if not selected:
+        raise Fault(f"no mutant is in {folder}")
+    return selected
+
+
+def isin(name, folder):
+    """Whether the file is in the folder, at any depth; all files are in the empty one."""
+    return not folder or name.startswith(folder.rstrip("/") + "/")
 
 
 def git(*arguments):
@@ -107,7 +130,15 @@ def limit_memory():
     resource.setrlimit(resource.RLIMIT_AS, (TEST_MEMORY_BYTES, TEST_MEMORY_BYTES))
 
 
-def build(folder, targets=("all",)):
+def targets_of(kind):
+    """Returns what has to be built for a kind of tests."""
+    if kind == "report":
+        return [f"report_{name}_test" for name in test_names(kind)] + [
+            "tolkwd-report", "tolkwd", "stepclock"]
+    return ["report_makepage"] if kind == "page" else ["all"]
+
+
+def build(folder, targets):
     """Builds these targets of the copy; raises where they do not build."""
     result = subprocess.run([*BUILD, "--target", *targets], cwd=folder, check=False,
                             stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True)
@@ -115,16 +146,17 @@ def build(folder, targets=("all",)):
         raise Fault(f"does not build:\n{result.stdout}")
 
 
-def run_tests(folder, kind, pattern="."):
+def run_tests(folder, kind, pattern=None):
     """Runs the tests of one kind until one fails; returns that one, a time-out, or None."""
-    command = ["ctest", "--test-dir", folder / "build/debug", "-L", kind, "-R", pattern,
+    command = ["ctest", "--test-dir", folder / "build/debug", *SELECTIONS.get(kind, ["-L", kind]),
+               *(["-R", pattern] if pattern else []),
                "--parallel", JOBS, "--stop-on-failure", "--no-tests=error"]
     scratch = folder / "scratch"  # for what a test that is killed leaves behind
     scratch.mkdir(exist_ok=True)
     output = []
     with subprocess.Popen(command, stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True,
                           env=os.environ | {"TMPDIR": str(scratch)}, start_new_session=True,
-                          preexec_fn=limit_memory) as ctest:
+                          preexec_fn=None if kind == "page" else limit_memory) as ctest:
         # All that it started is in the session that it leads.
         bound = threading.Timer(TEST_SECONDS[kind], os.killpg, [ctest.pid, signal.SIGKILL])
         bound.start()
@@ -132,7 +164,8 @@ def run_tests(folder, kind, pattern="."):
             for line in ctest.stdout:
                 output.append(line)
                 if failed := FAILED_TEST.search(line):
-                    return failed.group(1)  # other tests may run on, or hang
+                    # Other tests may run on, or hang.
+                    return failed["test"] or f"in a browser: {failed['part']}"
             ctest.wait()
         finally:
             bound.cancel()
@@ -147,19 +180,27 @@ def run_tests(folder, kind, pattern="."):
 
 def kinds_for(mutant):
     """Returns the kinds of tests that may catch the mutant."""
-    return KINDS[mutant["file"].split("/")[0]]
+    return next(kinds for folder, kinds in KINDS.items() if isin(mutant["file"], folder))
+
+
+def test_names(kind):
+    """Returns the sets of tests of a kind that are programs of their own."""
+    return [path.name.removesuffix("_test.cpp")
+            for path in sorted((ROOT / "tests" / kind).glob("*_test.cpp"))]
 
 
 def own_tests(kind, module):
     """Returns the target and the name's beginning of each set of tests made for the module: those
     of probe are also for probetext, and those of values for namevalues."""
-    prefix = {"unit": "", "check": "check_"}[kind]
-    names = [path.name.removesuffix("_test.cpp")
-             for path in sorted((ROOT / "tests" / kind).glob("*_test.cpp"))]
-    if kind == "check":
-        names = [name for name in names if module.startswith(name) or module.endswith(name)]
-    else:
+    if kind == "page":
+        return []
+    prefix = {"unit": "", "check": "check_", "report": "report_"}[kind]
+    module = TESTED_WITH.get(module, module)
+    names = test_names(kind)
+    if kind == "unit":
         names = [name for name in names if name == module]
+    else:
+        names = [name for name in names if module.startswith(name) or module.endswith(name)]
     return [(f"{prefix}{name}_test", f"{prefix.replace('_', '.')}{name}.") for name in names]
 
 
@@ -169,24 +210,30 @@ def catch(folder, kinds, module):
         build(folder, [target])
         if caught := run_tests(folder, kinds[0], f"^{re.escape(prefix)}"):
             return caught
-    build(folder)
+    build(folder, all_targets(kinds))
     for kind in kinds:
         if not (caught := run_tests(folder, kind)):
             continue
-        if kind == "system":
-            # A busy machine can do that, too: whoever catches it has to catch it again.
+        if kind in UNSTEADY:
+            # Whoever catches it has to catch it again.
             caught = run_tests(folder, kind)
             if caught == TIME_OUT:
-                raise Fault("the system tests take too long to tell")
+                raise Fault(f"the {kind} tests take too long to tell")
         return caught
     return None
+
+
+def all_targets(kinds):
+    """Returns what has to be built for these kinds of tests, each once."""
+    targets = dict.fromkeys(target for kind in kinds for target in targets_of(kind))
+    return ["all"] if "all" in targets else list(targets)
 
 
 def prepare(folder, kinds):
     """Copies and builds the unbroken programs, which have to pass their tests."""
     copy_project(folder)
     subprocess.run(CONFIGURE, cwd=folder, check=True, stdout=subprocess.DEVNULL)
-    build(folder)
+    build(folder, all_targets(kinds))
     for kind in kinds:
         if failed := run_tests(folder, kind):
             raise Fault(f"the unbroken program fails: {failed}")
@@ -241,8 +288,8 @@ def parse_arguments():
                                      formatter_class=argparse.RawDescriptionHelpFormatter)
     parser.add_argument("--only", nargs="+", default=[], metavar="NAME",
                         help="try these mutants only")
-    parser.add_argument("--in", dest="folder", choices=KINDS, default="",
-                        help="try the mutants of this folder only: tools has the checker's")
+    parser.add_argument("--in", dest="folder", metavar="FOLDER", default="",
+                        help="try the mutants of this folder only: tools/tolkwd-report, say")
     parser.add_argument("--table", metavar="FILE",
                         help="write a Markdown table of the results to FILE")
     parser.add_argument("--list", action="store_true",
