@@ -7,6 +7,7 @@ rounds' times and of their ratios count. The file has been read before: it comes
 """
 
 import argparse
+import heapq
 import json
 import os
 import pathlib
@@ -22,7 +23,6 @@ MEGABYTE = 10**6
 GIGABYTE = 10**9
 BRIEF_BYTES = 10**7
 ROUNDS = 9
-LINES_AT_ONCE = 100_000
 START = 1795273200  # 2026-11-21 15:00 UTC
 SEED = 1
 LOOK_SECONDS = 0.005
@@ -32,6 +32,12 @@ NOTICE = "INFO wdmonitorthread"
 FIGURES = "DEBUG ProcessStatistics"
 
 
+# Of the daemon's clock: how long a status command or a check takes, and the pauses.
+COMMAND_SECONDS = (0.01, 0.06)
+FUNCTIONAL_PAUSE_SECONDS = 5
+GENERAL_PAUSE_SECONDS = 60
+
+
 def announcement(name):
     """What a monitor's thread says first."""
     return [(NOTICE, f"Name of the service being monitored: {name}"),
@@ -39,12 +45,15 @@ def announcement(name):
 
 
 def healthy_round(name, chance):
-    """What it says, with debug lines, of a service that runs."""
+    """What it says, with debug lines, of a service that runs: lines that come at once, and the
+    seconds behind them."""
     output = f"/opt/varden/tolk/bin/agent.{name}"
     path = f"(/usr/sbin/{name}d)"
-    return [
+    yield [
         (MONITOR, "Entering of general ping function, before get read lock."),
         (MONITOR, "enter of general ping, after get read lock."),
+    ], chance.uniform(*COMMAND_SECONDS)
+    yield [
         (MONITOR, f"command = service {name} status 1>{output} 2>{output}, "
                   f"result = {name} is running., state = 0"),
         (MONITOR, "General ping successful!"),
@@ -55,35 +64,50 @@ def healthy_round(name, chance):
         (NOTICE, f"{path} Executing functional ping now ... "),
         (MONITOR, f"Performing functional ping, process id is: 112, fp cmd is: "
                   f"(timeout -k 1 10 /usr/bin/{name}-check && echo service: ok)"),
+    ], chance.uniform(*COMMAND_SECONDS)
+    yield [
         (MONITOR, "Functionalping result correct functional ping, thread id is 112, "
                   "ping result is service: ok"),
-        (MONITOR, "Functional ping sleep 5"),
-        (MONITOR, "General ping sleep 60"),
-    ]
+        (MONITOR, f"Functional ping sleep {FUNCTIONAL_PAUSE_SECONDS}"),
+    ], FUNCTIONAL_PAUSE_SECONDS
+    yield [(MONITOR, f"General ping sleep {GENERAL_PAUSE_SECONDS}")], GENERAL_PAUSE_SECONDS
+
+
+def life(name, chance):
+    """What a monitor's thread says, without end."""
+    yield announcement(name), 0
+    while True:
+        yield from healthy_round(name, chance)
+
+
+def bursts():
+    """Who says what when, in the order of the log. The monitors, which begin at once on a machine,
+    have drifted apart: their rounds overlap as their commands do."""
+    chance = random.Random(SEED)
+    lives = [life(f"web{who:02}", chance) for who in range(SERVICES)]
+    due = [(START + chance.uniform(0, GENERAL_PAUSE_SECONDS), who) for who in range(SERVICES)]
+    heapq.heapify(due)
+    while True:
+        now, who = due[0]
+        said, pause = next(lives[who])
+        yield now, who, said
+        heapq.heapreplace(due, (now + pause, who))
 
 
 def write_log(path, size):
-    """A log with debug lines of at least so many bytes, its services' lines mixed at random."""
-    chance = random.Random(SEED)
-    names = [f"web{number:02}" for number in range(SERVICES)]
-    ahead = [announcement(name)[::-1] for name in names]
+    """A log with debug lines of at least so many bytes, and how many lines it has."""
     stamp, second = "", -1
     written = number = 0
     with path.open("w", encoding="ascii") as out:
-        while written < size:
-            lines = []
-            for _ in range(LINES_AT_ONCE if size > MEGABYTE else LINES_AT_ONCE // 100):
-                who = chance.randrange(SERVICES)
-                if not ahead[who]:
-                    ahead[who] = healthy_round(names[who], chance)[::-1]
-                speaker, text = ahead[who].pop()
-                number += 1
-                if number // 10 != second:  # ten lines a second
-                    second = number // 10
-                    stamp = time.asctime(time.gmtime(START + second))
-                lines.append(f"{stamp} {speaker}|TID{140217598280000 + who} {text}\n")
-            written += out.write("".join(lines))
-    return number
+        for now, who, said in bursts():
+            if int(now) != second:
+                second = int(now)
+                stamp = time.asctime(time.gmtime(second))
+            for speaker, text in said:
+                written += out.write(f"{stamp} {speaker}|TID{140217598280000 + who} {text}\n")
+            number += len(said)
+            if written >= size:
+                return number
 
 
 class Programs:
@@ -156,7 +180,7 @@ def results(programs, folder, large, rounds):
                          "peak memory (MiB)"],
              "rows": rows,
              "note": f"Whole processes, on files that are in memory: debug lines of {SERVICES} "
-             "services, every check with its figures, mixed at random, ten lines a second."}
+             "services, every check with its figures, each at its own time, ten lines a second."}
     goals = [{"id": "logs-small", "text": "telling the state from a log of 1 MB",
               "measured": round(found["small"]["report"] * 1000, 1), "limit": 50, "unit": "ms",
               "sense": "at most"},

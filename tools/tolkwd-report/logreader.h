@@ -61,7 +61,8 @@ public:
 
     // Likewise all bytes that `read` gives. Where these are many, lines are taken apart by other
     // threads, too: then `read` is called by any of them, by one at a time. Messages are told by
-    // this one. What `read` throws is thrown here, after the messages before.
+    // this one. What `read` throws is thrown here; of the last bytes before, the messages may not
+    // have been told.
     void feedall(const bytesource& read, const pace& how = pace::ofmachine());
 
     // There is nothing more for now: hands on what was held back for lines that might follow it. A
