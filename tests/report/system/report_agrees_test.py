@@ -76,23 +76,30 @@ class Reckoned:
         begins = [course.seconds(span.since) for span in spans]
         stretches = list(zip(spans, begins, [*begins[1:], end]))
         self.last, self.since, _ = stretches[-1]
+        self.endedby = None  # the span behind the last outage
         self.outages = []
         for out, group in itertools.groupby(stretches, lambda each: each[0].state
                                             in stories.OUTAGES):
             group = list(group)
             if out:
                 self.outages.append((group[0][1], group[-1][2]))
+                self.endedby = None
+            elif self.outages and self.endedby is None:
+                self.endedby = group[0][0]
         self.outageseconds = sum(to - begin for begin, to in self.outages)
         self.watchedseconds = sum(to - begin for span, begin, to in stretches
                                   if span.state != stories.UNWATCHED)
 
-    def lastoutage(self):
+    def lastoutage(self, told):
+        """As it has to be told; whether its end is inferred is as told where that may be or not."""
         if not self.outages:
             return None
         begin, to = self.outages[-1]
-        lasts = self.last.state in stories.OUTAGES
-        return {"from": stories.isotime(begin), "to": None if lasts else stories.isotime(to),
-                "seconds": to - begin}
+        inferred = self.endedby is not None and self.endedby.inferred
+        return {"from": stories.isotime(begin),
+                "to": None if self.endedby is None else stories.isotime(to),
+                "seconds": to - begin,
+                "inferred": told and told["inferred"] if inferred is None else inferred}
 
 
 def test_the_status_is_what_has_become_of_it(played, report):
@@ -116,7 +123,7 @@ def test_the_status_is_what_has_become_of_it(played, report):
                     "since": stories.isotime(reckoned.since),
                     "seconds": end - reckoned.since,
                     "path": f"/usr/sbin/{service}",
-                    "lastoutage": reckoned.lastoutage(),
+                    "lastoutage": reckoned.lastoutage(found["lastoutage"]),
                     "outages": len(reckoned.outages),
                     "outageseconds": reckoned.outageseconds,
                     "recoveries": {"tried": figures.tried, "successful": figures.successful},
