@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <array>
 
+#include <nlohmann/json.hpp>
+
 #include "textjson.h"
 
 namespace check {
@@ -68,6 +70,20 @@ ordered_json resultjson(const std::string& name, const sourcetext& source, const
             {"loaded", view.loaded},
             {"findings", list},
             {"targets", targets}};
+}
+
+std::string resulttext(const std::string& name, const sourcetext& source, const daemonview& view,
+                       const std::vector<finding>& found, const std::vector<targetplan>* plan,
+                       const std::vector<targetprobe>* probes)
+{
+    auto result = resultjson(name, source, view, found);
+    if (plan != nullptr) {
+        result["plan"] = planjson(*plan);
+    }
+    if (probes != nullptr) {
+        result["probe"] = probejson(*probes);
+    }
+    return result.dump(2);
 }
 
 } // namespace check

@@ -4,10 +4,12 @@
 #include <string>
 #include <vector>
 
-#include <nlohmann/json.hpp>
+#include <nlohmann/json_fwd.hpp>
 
 #include "daemonview.h"
 #include "finding.h"
+#include "plan.h"
+#include "probe.h"
 #include "sourcetext.h"
 
 namespace check {
@@ -18,5 +20,10 @@ inline constexpr int kFormatVersion = 1;
 // What was found, and what the daemon reads. One thread.
 nlohmann::ordered_json resultjson(const std::string& name, const sourcetext& source,
                                   const daemonview& view, const std::vector<finding>& found);
+
+// The same as text, with the plan and the probe unless they are null. One thread.
+std::string resulttext(const std::string& name, const sourcetext& source, const daemonview& view,
+                       const std::vector<finding>& found, const std::vector<targetplan>* plan,
+                       const std::vector<targetprobe>* probes);
 
 } // namespace check

@@ -157,16 +157,14 @@ bool probeconfirmed(const options& chosen, const daemonview& view)
     return answer == "y" || answer == "yes";
 }
 
-// What was asked for besides the findings.
-void addparts(nlohmann::ordered_json& result, const options& chosen,
-              const std::vector<targetplan>& plan, const std::vector<targetprobe>& probes)
+// With what was asked for besides the findings.
+void writejson(const options& chosen, const sourcetext& source, const daemonview& view,
+               const std::vector<finding>& found, const std::vector<targetplan>& plan,
+               const std::vector<targetprobe>& probes)
 {
-    if (chosen.plan) {
-        result["plan"] = planjson(plan);
-    }
-    if (chosen.probe) {
-        result["probe"] = probejson(probes);
-    }
+    std::cout << resulttext(chosen.file, source, view, found, chosen.plan ? &plan : nullptr,
+                            chosen.probe ? &probes : nullptr)
+              << '\n';
 }
 
 int unreadable(const options& chosen, const std::string& reason)
@@ -178,9 +176,7 @@ int unreadable(const options& chosen, const std::string& reason)
     view.loaded = false;
     const auto sorted = found.sorted();
     if (chosen.json) {
-        auto result = resultjson(chosen.file, nothing, view, sorted);
-        addparts(result, chosen, {}, {});
-        std::cout << result.dump(2) << '\n';
+        writejson(chosen, nothing, view, sorted, {}, {});
     } else {
         writefindings(std::cout, chosen.file, nothing, sorted, tools::colourwanted());
     }
@@ -210,9 +206,7 @@ int checkfile(const options& chosen, const sourcetext& source, const std::string
     const auto plan =
         chosen.plan ? makeplan(view, refreshperiod(chosen.refresh)) : std::vector<targetplan>();
     if (chosen.json) {
-        auto result = resultjson(chosen.file, source, view, sorted);
-        addparts(result, chosen, plan, probes);
-        std::cout << result.dump(2) << '\n';
+        writejson(chosen, source, view, sorted, plan, probes);
     } else {
         const bool colour = tools::colourwanted();
         writefindings(std::cout, chosen.file, source, sorted, colour);

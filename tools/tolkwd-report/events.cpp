@@ -48,17 +48,6 @@ void writeline(std::ostream& out, const event& what, const std::string* name,
         << tools::coloured(colourof(what), words, colour && what.became) << '\n';
 }
 
-std::string jsontext(const event& what, const std::string* name, const std::string& words,
-                     bool withversion)
-{
-    nlohmann::ordered_json object;
-    if (withversion) {
-        object["version"] = kFormatVersion;
-    }
-    object.update(eventjson(what, name, words));
-    return textof(object, -1);
-}
-
 // Not written before it is sure that the log can be read.
 std::string documentbegin()
 {
@@ -126,10 +115,10 @@ void eventwriter::told(const event& what, const std::string* name)
         break;
     case eventform::kDocument:
         out << (std::exchange(first, false) ? documentbegin() + "\n" : ",\n")
-            << jsontext(what, name, words, false);
+            << eventjson(what, name, words, false);
         break;
     case eventform::kLines:
-        out << jsontext(what, name, words, true) << '\n';
+        out << eventjson(what, name, words, true) << '\n';
         break;
     }
     ensure(out);

@@ -1,5 +1,7 @@
 #include "json.h"
 
+#include <nlohmann/json.hpp>
+
 #include "textjson.h"
 
 namespace report {
@@ -72,36 +74,45 @@ ordered_json saidjson(const message* said)
     return tools::textjson(text);
 }
 
+// Text that steers no terminal, with an indent of `indent` blanks, or in one line if that is -1.
+std::string textof(const ordered_json& document, int indent)
+{
+    constexpr bool kAsciiOnly = true; // some of the other characters are control characters
+    return document.dump(indent, ' ', kAsciiOnly);
+}
+
 } // namespace
 
-ordered_json statusjson(const overview& seen)
+std::string statusjson(const overview& seen)
 {
     ordered_json services = ordered_json::array();
     for (const account& each : seen.services) {
         services.push_back(servicejson(each, seen.judged));
     }
-    return {{"version", kFormatVersion},
-            {"log", logjson(seen)},
-            {"loadfailed", seen.loadfailed},
-            {"services", services}};
+    return textof({{"version", kFormatVersion},
+                   {"log", logjson(seen)},
+                   {"loadfailed", seen.loadfailed},
+                   {"services", services}},
+                  2);
 }
 
-ordered_json eventjson(const event& what, const std::string* name, std::string_view words)
+std::string eventjson(const event& what, const std::string* name, std::string_view words,
+                      bool withversion)
 {
-    return {{"time", isotext(what.when)},
-            {"service", name == nullptr ? ordered_json() : tools::textjson(*name)},
-            {"state", what.became ? ordered_json(wordof(*what.became)) : ordered_json()},
-            {"kind", wordof(what.kind)},
-            {"inferred", what.inferred},
-            {"words", words},
-            {"message", saidjson(what.source)},
-            {"line", what.source == nullptr ? ordered_json() : ordered_json(what.source->line)}};
-}
-
-std::string textof(const ordered_json& document, int indent)
-{
-    constexpr bool kAsciiOnly = true; // some of the other characters are control characters
-    return document.dump(indent, ' ', kAsciiOnly);
+    ordered_json object;
+    if (withversion) {
+        object["version"] = kFormatVersion;
+    }
+    object.update(
+        {{"time", isotext(what.when)},
+         {"service", name == nullptr ? ordered_json() : tools::textjson(*name)},
+         {"state", what.became ? ordered_json(wordof(*what.became)) : ordered_json()},
+         {"kind", wordof(what.kind)},
+         {"inferred", what.inferred},
+         {"words", words},
+         {"message", saidjson(what.source)},
+         {"line", what.source == nullptr ? ordered_json() : ordered_json(what.source->line)}});
+    return textof(object, -1);
 }
 
 } // namespace report

@@ -64,7 +64,7 @@ int runstatus(const options& chosen)
 {
     const overview seen = readoverview(chosen.logs, chosen.asofnow, {});
     if (chosen.json) {
-        std::cout << textof(statusjson(seen), 2) << '\n';
+        std::cout << statusjson(seen) << '\n';
     } else {
         writestatus(std::cout, seen, outputcolumns(), tools::colourwanted());
     }
