@@ -7,7 +7,6 @@
 #include <exception>
 #include <functional>
 #include <iostream>
-#include <set>
 #include <stdexcept>
 #include <string>
 #include <string_view>
@@ -17,8 +16,7 @@
 
 #include <unistd.h>
 
-#include <CLI/CLI.hpp>
-
+#include "commandline.h"
 #include "daemonview.h"
 #include "files.h"
 #include "finding.h"
@@ -45,7 +43,7 @@ using namespace check;
 
 struct options {
     std::string file;
-    std::set<std::string, std::less<>> allowed;
+    std::vector<std::string> allowed;
     std::string explained;
     int refresh = kDefaultRefreshSeconds;
     bool listrules = false;
@@ -86,49 +84,42 @@ int listrules()
     return 0;
 }
 
-// Of a word on the command line that it does not understand, CLI11 repeats every byte.
-std::string refusal(const CLI::App* /*app*/, const CLI::Error& error)
-{
-    return tools::printable(error.what()) + "\nRun with --help for more information.\n";
-}
-
 // Ends the process where the command line is wrong, or asks for nothing but help.
 options parse(int argc, char** argv)
 {
-    CLI::App app("Tells what tolkwd will make of a configuration, and what is wrong with it.",
-                 "tolkwd-check");
+    tools::commandline line(
+        "tolkwd-check",
+        "Tells what tolkwd will make of a configuration, and what is wrong with it.");
     options chosen;
-    const CLI::Validator arule(
-        [](std::string& name) {
-            return isrule(name) ? std::string() : "no rule is named " + tools::inquotes(name);
-        },
-        "", "rule");
-    app.add_option("FILE", chosen.file, "The configuration; - for standard input");
-    app.add_flag("--plan", chosen.plan, "Tell what an outage of each service will look like");
-    app.add_option("-t", chosen.refresh,
-                   "The daemon's -t, its refresh period in seconds, for --plan")
-        ->type_name("SECONDS");
-    app.add_flag("--probe", chosen.probe,
-                 "Run each status command and each check once, after asking");
-    app.add_flag("--yes", chosen.yes, "Do not ask before --probe runs anything");
-    app.add_flag("--json", chosen.json, "Write everything as one JSON object");
-    app.add_option("--allow", chosen.allowed, "Do not report what this rule finds; repeatable")
-        ->type_name("RULE")
-        ->allow_extra_args(false)
-        ->check(arule);
-    app.add_option("--explain", chosen.explained, "Explain a rule, with examples")
-        ->type_name("RULE")
-        ->check(arule);
-    app.add_flag("--rules", chosen.listrules, "List all rules");
-    app.set_version_flag("--version", "tolkwd-check " TOLKWD_VERSION);
-    app.failure_message(refusal);
-    try {
-        app.parse(argc, argv);
-        if (chosen.file.empty() && chosen.explained.empty() && !chosen.listrules) {
-            throw CLI::RequiredError("FILE");
-        }
-    } catch (const CLI::ParseError& error) {
-        std::exit(app.exit(error) == 0 ? tools::delivered(0) : tools::kUsageStatus);
+    const tools::valuecheck arule = [](const std::string& name) {
+        return isrule(name) ? std::string() : "no rule is named " + tools::inquotes(name);
+    };
+    line.addoption(
+        {.name = "FILE", .type = "TEXT", .help = "The configuration; - for standard input"},
+        chosen.file);
+    line.addflag("--plan", "Tell what an outage of each service will look like", chosen.plan);
+    line.addoption({.name = "-t",
+                    .type = "SECONDS",
+                    .help = "The daemon's -t, its refresh period in seconds, for --plan"},
+                   chosen.refresh);
+    line.addflag("--probe", "Run each status command and each check once, after asking",
+                 chosen.probe);
+    line.addflag("--yes", "Do not ask before --probe runs anything", chosen.yes);
+    line.addflag("--json", "Write everything as one JSON object", chosen.json);
+    line.addoption({.name = "--allow",
+                    .type = "RULE",
+                    .help = "Do not report what this rule finds; repeatable",
+                    .check = arule},
+                   chosen.allowed);
+    line.addoption({.name = "--explain",
+                    .type = "RULE",
+                    .help = "Explain a rule, with examples",
+                    .check = arule},
+                   chosen.explained);
+    line.addflag("--rules", "List all rules", chosen.listrules);
+    line.parse(argc, argv);
+    if (chosen.file.empty() && chosen.explained.empty() && !chosen.listrules) {
+        line.refusewithout("FILE");
     }
     return chosen;
 }
@@ -169,7 +160,7 @@ void writejson(const options& chosen, const sourcetext& source, const daemonview
 
 int unreadable(const options& chosen, const std::string& reason)
 {
-    findings found(chosen.allowed);
+    findings found({chosen.allowed.begin(), chosen.allowed.end()});
     found.add("unreadable-file", severity::error, kNoPlace, "the file cannot be read: " + reason);
     const sourcetext nothing("");
     daemonview view;
@@ -186,7 +177,7 @@ int unreadable(const options& chosen, const std::string& reason)
 // `folder`: for the output of commands, where there is a probe.
 int checkfile(const options& chosen, const sourcetext& source, const std::string& folder)
 {
-    findings found(chosen.allowed);
+    findings found({chosen.allowed.begin(), chosen.allowed.end()});
     const daemonview view = readasdaemon(source.text());
     if (chosen.probe && !probeconfirmed(chosen, view)) {
         std::cerr << "nothing was run\n";

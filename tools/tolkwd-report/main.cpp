@@ -20,11 +20,11 @@
 #include <poll.h>
 #include <unistd.h>
 
-#include <CLI/CLI.hpp>
 #include <fmt/format.h>
 #include <fmt/ranges.h>
 
 #include "columns.h"
+#include "commandline.h"
 #include "events.h"
 #include "history.h"
 #include "json.h"
@@ -153,36 +153,20 @@ int runmessages(const options& /*chosen*/)
     return 0;
 }
 
-// Of a word on the command line that it does not understand, CLI11 repeats every byte.
-std::string refusal(const CLI::App* /*app*/, const CLI::Error& error)
+std::string kindcheck(const std::string& word)
 {
-    return tools::printable(error.what()) + "\nRun with --help for more information.\n";
+    return eventkindof(word)
+               ? std::string()
+               : fmt::format("{} is no kind of event; these are: {}", tools::inquotes(word),
+                             fmt::join(eventkindwords(), ", "));
 }
 
-const CLI::Validator& akind()
+std::string timecheck(const std::string& text)
 {
-    static const CLI::Validator check(
-        [](std::string& word) {
-            return eventkindof(word)
-                       ? std::string()
-                       : fmt::format("{} is no kind of event; these are: {}", tools::inquotes(word),
-                                     fmt::join(eventkindwords(), ", "));
-        },
-        "", "kind");
-    return check;
-}
-
-const CLI::Validator& atime()
-{
-    static const CLI::Validator check(
-        [](std::string& text) {
-            return clockof(text, std::time(nullptr))
-                       ? std::string()
-                       : fmt::format("{} is no time; understood are {}", tools::inquotes(text),
-                                     fmt::join(kTimeExamples, ", "));
-        },
-        "", "time");
-    return check;
+    return clockof(text, std::time(nullptr))
+               ? std::string()
+               : fmt::format("{} is no time; understood are {}", tools::inquotes(text),
+                             fmt::join(kTimeExamples, ", "));
 }
 
 // `items` in lines that a terminal shows whole, with commas between.
@@ -202,110 +186,98 @@ std::string listed(const Items& items)
     return lines + line;
 }
 
-void addlogs(CLI::App& command, options& chosen)
+void addlogs(tools::commandline& command, options& chosen)
 {
-    command
-        .add_option("LOG", chosen.logs,
-                    fmt::format("Logs, oldest first; - is standard input [{}]", kDefaultLog))
-        ->type_name("");
+    command.addoption(
+        {.name = "LOG",
+         .type = "",
+         .help = fmt::format("Logs, oldest first; - is standard input [{}]", kDefaultLog)},
+        chosen.logs);
 }
 
-void addasofnow(CLI::App& command, options& chosen)
+void addasofnow(tools::commandline& command, options& chosen)
 {
-    command.add_flag("--now", chosen.asofnow,
-                     "Judge as of the present, not of the log's last line");
+    command.addflag("--now", "Judge as of the present, not of the log's last line", chosen.asofnow);
 }
 
-void addjson(CLI::App& command, options& chosen, const char* what)
+void addstatus(tools::commandline& line, options& chosen)
 {
-    command.add_flag("--json", chosen.json, what);
-}
-
-void addstatus(CLI::App& app, options& chosen)
-{
-    CLI::App& command = *app.add_subcommand("status", "Tell how each service is, and was");
+    tools::commandline command = line.addcommand("status", "Tell how each service is, and was",
+                                                 [&chosen] { chosen.run = runstatus; });
     addlogs(command, chosen);
     addasofnow(command, chosen);
-    addjson(command, chosen, "Write one JSON object");
-    command.footer(
+    command.addflag("--json", "Write one JSON object", chosen.json);
+    command.setfooter(
         "While all is well a daemon may write nothing for long; a log does not tell that\n"
         "from its end. A state marked with ~ is inferred: no message says so, or when.\n\n"
         "Exit status: 0 where all services are up, busy or not watched, 1 where somebody\n"
         "should look or nothing is watched at all, 2 where a log cannot be read.");
-    command.callback([&chosen] { chosen.run = runstatus; });
 }
 
-void addeventfilters(CLI::App& command, options& chosen)
+void addeventfilters(tools::commandline& command, options& chosen)
 {
-    command.add_option("--service", chosen.services, "Only of this service; repeatable")
-        ->type_name("NAME")
-        ->allow_extra_args(false);
-    command.add_option("--kind", chosen.kinds, "Only of this kind; repeatable")
-        ->type_name("KIND")
-        ->allow_extra_args(false)
-        ->check(akind());
-    command.add_option("--since", chosen.since, "Only from this time on")
-        ->type_name("WHEN")
-        ->check(atime());
-    command.add_option("--until", chosen.until, "Only up to this time")
-        ->type_name("WHEN")
-        ->check(atime());
-    command.add_flag("--all", chosen.all, "Also what is routine: checks, figures and all steps");
+    command.addoption(
+        {.name = "--service", .type = "NAME", .help = "Only of this service; repeatable"},
+        chosen.services);
+    command.addoption({.name = "--kind",
+                       .type = "KIND",
+                       .help = "Only of this kind; repeatable",
+                       .check = kindcheck},
+                      chosen.kinds);
+    command.addoption(
+        {.name = "--since", .type = "WHEN", .help = "Only from this time on", .check = timecheck},
+        chosen.since);
+    command.addoption(
+        {.name = "--until", .type = "WHEN", .help = "Only up to this time", .check = timecheck},
+        chosen.until);
+    command.addflag("--all", "Also what is routine: checks, figures and all steps", chosen.all);
 }
 
-void addevents(CLI::App& app, options& chosen)
+void addevents(tools::commandline& line, options& chosen)
 {
-    CLI::App& command = *app.add_subcommand("events", "Tell what happened, a line for each event");
+    tools::commandline command =
+        line.addcommand("events", "Tell what happened, a line for each event",
+                        [&chosen] { chosen.run = runevents; });
     addlogs(command, chosen);
     addeventfilters(command, chosen);
-    command.add_flag("--follow", chosen.follow, "Go on as the last log grows");
-    addjson(command, chosen, "Write one JSON object; with --follow, one a line");
-    command.footer(fmt::format(
+    command.addflag("--follow", "Go on as the last log grows", chosen.follow);
+    command.addflag("--json", "Write one JSON object; with --follow, one a line", chosen.json);
+    command.setfooter(fmt::format(
         "KIND:\n{}\nWHEN, on the log's clock; a day alone is its beginning:\n{}\n\n"
         "A line marked with ~ is inferred: no message says so, or when. It stands where\n"
         "the log makes it certain.",
         listed(eventkindwords()), listed(kTimeExamples)));
-    command.callback([&chosen] { chosen.run = runevents; });
 }
 
-void addhtml(CLI::App& app, options& chosen)
+void addhtml(tools::commandline& line, options& chosen)
 {
-    CLI::App& command =
-        *app.add_subcommand("html", "Make a page with a time line for each service");
+    tools::commandline command =
+        line.addcommand("html", "Make a page with a time line for each service",
+                        [&chosen] { chosen.run = runhtml; });
     addlogs(command, chosen);
-    command.add_option("-o", chosen.page, "The page's file; - for standard output")
-        ->type_name("FILE")
-        ->required();
+    command.addoption({.name = "-o",
+                       .type = "FILE",
+                       .help = "The page's file; - for standard output",
+                       .required = true},
+                      chosen.page);
     addasofnow(command, chosen);
-    command.callback([&chosen] { chosen.run = runhtml; });
-}
-
-void addmessages(CLI::App& app, options& chosen)
-{
-    app.add_subcommand("messages", "List the daemon's messages, and what they mean")
-        ->callback([&chosen] { chosen.run = runmessages; });
 }
 
 // Ends the process where the command line is wrong, or asks for nothing but help.
 options parse(int argc, char** argv)
 {
-    CLI::App app("Answers from tolkwd's log: what is up, what was down, since when, how often.",
-                 "tolkwd-report");
+    tools::commandline line(
+        "tolkwd-report",
+        "Answers from tolkwd's log: what is up, what was down, since when, how often.");
     options chosen;
-    addstatus(app, chosen);
-    addevents(app, chosen);
-    addhtml(app, chosen);
-    addmessages(app, chosen);
-    app.require_subcommand(0, 1); // a word in its place is refused by its name
-    app.set_version_flag("--version", "tolkwd-report " TOLKWD_VERSION);
-    app.failure_message(refusal);
-    try {
-        app.parse(argc, argv);
-        if (!chosen.run) {
-            throw CLI::RequiredError("one of status, events, html and messages");
-        }
-    } catch (const CLI::ParseError& error) {
-        std::exit(app.exit(error) == 0 ? tools::delivered(0) : tools::kUsageStatus);
+    addstatus(line, chosen);
+    addevents(line, chosen);
+    addhtml(line, chosen);
+    line.addcommand("messages", "List the daemon's messages, and what they mean",
+                    [&chosen] { chosen.run = runmessages; });
+    line.parse(argc, argv);
+    if (!chosen.run) {
+        line.refusewithout("one of status, events, html and messages");
     }
     if (chosen.logs.empty()) {
         chosen.logs.emplace_back(kDefaultLog);
