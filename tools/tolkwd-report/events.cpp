@@ -4,7 +4,7 @@
 #include <string_view>
 #include <utility>
 
-#include <fmt/format.h>
+#include <fmt/core.h>
 
 #include "columns.h"
 #include "json.h"

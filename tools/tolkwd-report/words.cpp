@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <string_view>
 
-#include <fmt/format.h>
+#include <fmt/core.h>
 
 #include "printable.h"
 #include "servicestate.h"
