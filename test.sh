@@ -20,7 +20,7 @@ done
 
 # Where there is no mirror, or no right to make a system.
 results=$root/build/release/Testing/Temporary/LastTest.log
-if grep -hom1 'no fresh system could be made: .*' "$results"; then
+if grep -hom1 'no machine could be booted: .*' "$results"; then
     printf 'so the packages were not installed anywhere\n'
 fi
 
