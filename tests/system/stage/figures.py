@@ -1,11 +1,13 @@
 """figures.py REFRESHES FILE: reads a daemon's standard output until it has refreshed so often.
 
 In each generation, when all monitors have begun and none can have ended, it notes how large the
-daemon is, how many descriptors it has open and how many threads. It ends with status 1 when one of
-these is larger after the last refreshes than after the first ten, and leaves a line of figures in
-FILE.
+daemon is, how many descriptors it has had open since the generation before, and how many threads it
+has. It ends with status 1 when one of these is larger after the last refreshes than after the first
+ten, and leaves a line of figures in FILE.
 """
 
+import contextlib
+import os
 import pathlib
 import sys
 
@@ -29,17 +31,26 @@ def daemon():
     raise SystemExit("there is no daemon")
 
 
-def sample(process):
-    """Resident kB, descriptors and threads."""
+def open_files(process):
+    """Each open descriptor with what it refers to."""
+    found = set()
+    for descriptor in (process / "fd").iterdir():
+        with contextlib.suppress(FileNotFoundError):  # closed meanwhile
+            found.add((descriptor.name, os.readlink(descriptor)))
+    return found
+
+
+def sample(process, kept):
+    """Resident kB, the number of the descriptors kept, and threads."""
     status = dict(line.split(":\t", 1)
                   for line in (process / "status").read_text().splitlines() if ":\t" in line)
-    descriptors = len(list((process / "fd").iterdir()))
-    return int(status["VmRSS"].split()[0]), descriptors, int(status["Threads"])
+    return int(status["VmRSS"].split()[0]), len(kept), int(status["Threads"])
 
 
 def main():
     refreshes, file = int(sys.argv[1]), pathlib.Path(sys.argv[2])
     process = None
+    before = None
     samples = []
     refreshed = pings = checks = since_refresh = 0
     for line in sys.stdin:
@@ -48,7 +59,10 @@ def main():
             since_refresh += 1
             if since_refresh == SAMPLED_PING:
                 process = process or daemon()
-                samples.append(sample(process))
+                now = open_files(process)
+                # A log line or a pipe that is half-way through is not there a generation later.
+                samples.append(sample(process, now & (before or now)))
+                before = now
         elif CHECK in line:
             checks += 1
         elif line.endswith(REFRESH + "\n"):
@@ -58,7 +72,7 @@ def main():
                 break
     else:
         raise SystemExit("the daemon has ended")
-    # What several generations have in common: one of them can meet a log line or a pipe half-way.
+    # The kernel's count of pages varies.
     first = [min(kind) for kind in zip(*samples[SETTLED:2 * SETTLED])]
     last = [min(kind) for kind in zip(*samples[-SETTLED:])]
     text = (f"{refreshes} refreshes, {pings} pings, {checks} checks: "
