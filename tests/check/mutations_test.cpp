@@ -1,11 +1,12 @@
-// Ten thousand mistakes in the sample configuration (MUTATIONS), the same at each run: what the
-// daemon's reader makes of a file is what the checker says, and whatever it makes otherwise than it
-// stands there is found.
+// MUTATIONS mistakes in the sample configuration, the same at each run: what the daemon's reader
+// makes of a file is what the checker says, and whatever it makes otherwise than it stands there is
+// found.
 
 #include <array>
 #include <cctype>
 #include <fstream>
 #include <functional>
+#include <iostream>
 #include <iterator>
 #include <map>
 #include <random>
@@ -454,6 +455,7 @@ TEST_F(Mutations, AreReadAsByTheDaemonAndFoundWhereTheyChangeSomething)
 {
     constexpr int kMutations = MUTATIONS;
     constexpr unsigned long kSeed = 20261121;
+    std::cout << "seed " << kSeed << ": " << kMutations << " mutations\n";
     const Reading meant = readbydaemon(sample);
     Mutator mutator(sample, kSeed);
     std::map<std::string, int> harmful;

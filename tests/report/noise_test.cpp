@@ -133,6 +133,6 @@ TEST_P(Noise, TellsEachMessageOnce)
     EXPECT_EQ(sources, kLines);
 }
 
-INSTANTIATE_TEST_SUITE_P(Seeds, Noise, testing::Range(0U, 100U));
+INSTANTIATE_TEST_SUITE_P(Seeds, Noise, testing::Range(0U, SEEDS));
 
 } // namespace

@@ -371,6 +371,6 @@ TEST_P(Rounds, LeaveFiguresThatAgreeWithTheirSpans)
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(Seeds, Rounds, testing::Range(0U, 40U));
+INSTANTIATE_TEST_SUITE_P(Seeds, Rounds, testing::Range(0U, SEEDS));
 
 } // namespace
