@@ -8,7 +8,8 @@ usage() {
     cat <<'TEXT'
 usage: run.sh
            Shows the daemon at work in a sandbox: a real service is killed and brought back.
-           Takes about a minute and leaves the machine's own services alone.
+           Takes a minute and a half, and the time to install what is missing. Leaves the
+           machine's own services alone.
        run.sh -i FILE -l FILE [-t SECONDS] [-g]
            Runs the daemon for real, in the foreground, as root:
            -i  the configuration          -t  seconds between refreshes (120 or more; 10800)
@@ -28,20 +29,29 @@ esac
 
 if [ $# -eq 0 ]; then
     setup build demo
-    build release -DBUILD_TESTING=OFF
+    build release tolkwd -DBUILD_TESTING=OFF
+    # The demonstration mostly waits.
+    nice cmake --build "$root/build/release" --target tolkwd-report >"$root/build/report.out" 2>&1 &
+    report=$!
+    trap 'kill "$report" 2>/dev/null || true' EXIT
     "$root/scripts/demo/run.sh" "$root/build/release/src/tolkwd" "$root/build/demo"
+    wait "$report" || fail "tolkwd-report does not build: $root/build/report.out"
     cat <<'TEXT'
 
-Its log is kept. What it tells, as a table and as a page to open in a browser:
+The log is kept. To read it as a table, or as a page in a browser:
     build/release/tools/tolkwd-report/tolkwd-report status build/demo/tolkwd.log
     build/release/tools/tolkwd-report/tolkwd-report html -o outage.html build/demo/tolkwd.log
+
+Not built yet: tolkwd-check, which checks a configuration, and the manual pages.
+    cmake --build build/release     builds them (a minute)
+    packaging/build.sh              builds everything and makes packages of it
 TEXT
     exit
 fi
 
 # Standard output belongs to the daemon's log.
 setup build >&2
-build release -DBUILD_TESTING=OFF >&2
+build release tolkwd -DBUILD_TESTING=OFF >&2
 # The daemon expects the folder of its pings' output; without it every ping would fail. Where it
 # will refuse its arguments anyway, the machine is left as it is.
 case " $* " in

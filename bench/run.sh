@@ -7,7 +7,7 @@ set -euo pipefail
 . "$(dirname "$0")/../scripts/setup.sh"
 
 setup build demo bench
-build release -DTOLKWD_BENCH=ON -DBUILD_TESTING=OFF
+build release all -DTOLKWD_BENCH=ON -DBUILD_TESTING=OFF
 
 built=$root/build/release
 results=$built/bench/results

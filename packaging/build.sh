@@ -6,7 +6,7 @@ set -euo pipefail
 . "$(dirname "$0")/../scripts/setup.sh"
 
 setup build package
-build release -DBUILD_TESTING=OFF
+build release all -DBUILD_TESTING=OFF
 cd "$root"
 for kind in DEB RPM; do
     cpack -G "$kind"

@@ -90,9 +90,10 @@ setup() {
     install_quietly "${missing[@]}"
 }
 
-# Configures and builds one preset; further arguments go to cmake's configuration.
+# build PRESET TARGET [OPTION...]: configures a preset with these options and builds this target.
 build() {
-    local preset=$1
-    shift
-    (cd "$root" && cmake --preset "$preset" "$@" >/dev/null && cmake --build --preset "$preset")
+    local preset=$1 target=$2
+    shift 2
+    (cd "$root" && cmake --preset "$preset" "$@" >/dev/null &&
+        cmake --build --preset "$preset" --target "$target")
 }

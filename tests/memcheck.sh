@@ -9,7 +9,7 @@ set -euo pipefail
 . "$(dirname "$0")/../scripts/setup.sh"
 
 setup build demo test memcheck
-build debug -DTOLKWD_WERROR=ON -DBUILD_TESTING=ON
+build debug all -DTOLKWD_WERROR=ON -DBUILD_TESTING=ON
 build=$root/build/debug
 output=$(mktemp)
 trap 'rm -f "$output"' EXIT
