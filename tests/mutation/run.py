@@ -6,16 +6,20 @@ mutants.toml lists the mutants; each replaces one piece of one source file and n
 that the program then no longer keeps. All work is done in a copy of the tracked files, as they are
 in the working tree, in a temporary folder. The copy is built once and has to pass its tests. Then,
 for each mutant: change the file, build, run the tests of its module, then all tests of the program,
-those of the daemon's units before those of the whole, until one fails, and put the file back.
+those of the daemon's units before those of the whole, until one fails, and put the file back. With
+--full, survivors are tried again with the tests of ./test.sh --full.
 
-The exit status is 0 when every mutant was caught, 1 when one survived, and 2 when the list, or the
-unbroken program itself, is at fault: a mutant that does not build, say, is not caught.
+The exit status is 0 when every mutant was caught, 1 when one survived the tests of each commit, and
+2 when the list, or the unbroken program itself, is at fault: a mutant that does not build, say, is
+not caught.
 """
 
 import argparse
+import collections
 import datetime
 import os
 import pathlib
+import random
 import re
 import resource
 import shutil
@@ -34,10 +38,11 @@ JOBS = "2"
 BUILD = ["cmake", "--build", "--preset", "debug", "--parallel", JOBS]
 # Without debug information: nobody debugs a mutant, and linking is most of the work.
 CONFIGURE = ["cmake", "--preset", "debug", "-DBUILD_TESTING=ON", "-DCMAKE_CXX_FLAGS_DEBUG=-O0"]
+FULL = "-DTOLKWD_FULL_TESTS="
 
 # Each kind of tests, and how long all of them may take together. A mutant that hangs is caught by
 # this bound; one that never stops growing is caught by the other.
-TEST_SECONDS = {"unit": 60, "system": 600, "check": 300, "report": 600, "page": 600}
+TEST_SECONDS = {"unit": 60, "system": 1800, "check": 300, "report": 600, "page": 600}
 TEST_MEMORY_BYTES = 4 << 30
 
 # Which tests are for the files of a folder, the quick ones first. Of two folders that hold a file
@@ -108,6 +113,18 @@ def select(mutants, names, folder):
 def isin(name, folder):
     """Whether the file is in the folder, at any depth; all files are in the empty one."""
     return not folder or name.startswith(folder.rstrip("/") + "/")
+
+
+def sample(mutants, count, seed):
+    """Returns so many mutants, drawn at random, spread evenly over the files."""
+    rounds = collections.Counter()
+    drawn = []
+    for mutant in random.Random(seed).sample(mutants, len(mutants)):
+        drawn.append((rounds[mutant["file"]], mutant))
+        rounds[mutant["file"]] += 1
+    drawn.sort(key=lambda each: each[0])
+    chosen = [mutant for _, mutant in drawn[:count]]
+    return [mutant for mutant in mutants if mutant in chosen]
 
 
 def git(*arguments):
@@ -183,6 +200,11 @@ def kinds_for(mutant):
     return next(kinds for folder, kinds in KINDS.items() if isin(mutant["file"], folder))
 
 
+def all_kinds(mutants):
+    """Returns the kinds of tests for these mutants, each once, in the order of their first use."""
+    return dict.fromkeys(kind for mutant in mutants for kind in kinds_for(mutant))
+
+
 def test_names(kind):
     """Returns the sets of tests of a kind that are programs of their own."""
     return [path.name.removesuffix("_test.cpp")
@@ -230,9 +252,14 @@ def all_targets(kinds):
 
 
 def prepare(folder, kinds):
-    """Copies and builds the unbroken programs, which have to pass their tests."""
+    """Copies the project, whose unbroken programs have to pass their tests."""
     copy_project(folder)
-    subprocess.run(CONFIGURE, cwd=folder, check=True, stdout=subprocess.DEVNULL)
+    check_unbroken(folder, kinds, full=False)
+
+
+def check_unbroken(folder, kinds, full):
+    """Builds the unbroken programs, which have to pass their tests."""
+    configure(folder, full)
     build(folder, all_targets(kinds))
     for kind in kinds:
         if failed := run_tests(folder, kind):
@@ -250,15 +277,32 @@ def try_mutant(folder, mutant):
         path.write_text(unbroken)  # with a new time, so that it is built again
 
 
-def try_mutants(mutants):
+def configure(folder, full):
+    """Chooses the tests of each commit, or those of ./test.sh --full."""
+    subprocess.run([*CONFIGURE, FULL + ("ON" if full else "OFF")], cwd=folder, check=True,
+                   stdout=subprocess.DEVNULL)
+
+
+def try_again(folder, survivors):
+    """Prints which of these mutants the tests of ./test.sh --full catch."""
+    if survivors:
+        check_unbroken(folder, all_kinds(survivors), full=True)
+    for mutant in survivors:
+        try:
+            caught = try_mutant(folder, mutant)
+            print(f"{mutant['name']}, by all tests: {caught or 'SURVIVED'}", flush=True)
+        except Fault as fault:
+            print(f"{mutant['name']}, by all tests: {fault}", flush=True)
+
+
+def try_mutants(mutants, full):
     """Returns (mutant, who caught it or None) for each that builds, and how many do not."""
     results = []
     faults = 0
     with tempfile.TemporaryDirectory(prefix="tolkwd-mutation-",
                                      ignore_cleanup_errors=True) as name:
         folder = pathlib.Path(name)
-        # Each kind once, in the order in which they are first needed.
-        prepare(folder, dict.fromkeys(kind for mutant in mutants for kind in kinds_for(mutant)))
+        prepare(folder, all_kinds(mutants))
         for mutant in mutants:
             try:
                 caught = try_mutant(folder, mutant)
@@ -267,6 +311,8 @@ def try_mutants(mutants):
             except Fault as fault:
                 faults += 1
                 print(f"{mutant['name']}: {fault}", flush=True)
+        if full:
+            try_again(folder, [mutant for mutant, caught in results if not caught])
     return results, faults
 
 
@@ -290,6 +336,11 @@ def parse_arguments():
                         help="try these mutants only")
     parser.add_argument("--in", dest="folder", metavar="FOLDER", default="",
                         help="try the mutants of this folder only: tools/tolkwd-report, say")
+    parser.add_argument("--sample", type=int, metavar="N",
+                        help="try N mutants only, drawn over all files")
+    parser.add_argument("--seed", type=int, default=1, help="what --sample draws with (1)")
+    parser.add_argument("--full", action="store_true",
+                        help="try what survives again, with the tests of ./test.sh --full")
     parser.add_argument("--table", metavar="FILE",
                         help="write a Markdown table of the results to FILE")
     parser.add_argument("--list", action="store_true",
@@ -304,11 +355,15 @@ def main():
     start = time.monotonic()
     try:
         mutants = select(load_mutants(), options.only, options.folder)
+        if options.sample:
+            mutants = sample(mutants, options.sample, options.seed)
+            print(f"{len(mutants)} mutants of {len({each['file'] for each in mutants})} files, "
+                  f"drawn with the seed {options.seed}", flush=True)
         if options.list:
             for mutant in mutants:
                 print(f"{mutant['name']}: {mutant['breaks']}")
             return 0
-        results, faults = try_mutants(mutants)
+        results, faults = try_mutants(mutants, options.full)
     except Fault as fault:
         print(fault, file=sys.stderr)
         return 2
