@@ -43,8 +43,6 @@ printf '\n== what the soak measured\n'
 grep -h ' refreshes, ' "${logs[@]}" || fail 'no figures in the logs'
 
 printf '\n== skipped\n'
-if ! grep -h '^SKIPPED' "${logs[@]}"; then
-    printf 'nothing\n'
-elif [ "$full" = ON ]; then
-    fail 'not everything was tested'
-fi
+skipped=$(sed -nE 's/^SKIPPED \[[0-9]+\] [^ ]*: //p' "${logs[@]}" | sort -u)
+printf '%s\n' "${skipped:-nothing}"
+[ "$full" = OFF ] || [ -z "$skipped" ] || fail 'not everything was tested'

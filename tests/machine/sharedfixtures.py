@@ -14,6 +14,14 @@ def pytest_addoption(parser):
                                         help="the build folder whose packages are tested")
 
 
+def pytest_sessionfinish(session, exitstatus):
+    """Where every test is skipped, pytest would end as if they had passed."""
+    reporter = session.config.pluginmanager.get_plugin("terminalreporter")
+    if reporter and exitstatus == pytest.ExitCode.OK:
+        if "skipped" in reporter.stats and "passed" not in reporter.stats:
+            session.exitstatus = systems.SKIPPED
+
+
 @pytest.fixture(scope="session")
 def build(request):
     return request.config.getoption("build").resolve()
