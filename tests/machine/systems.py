@@ -96,7 +96,7 @@ def base_system():
 
 
 def make(command):
-    """Runs the recipe. A mirror that does not answer is no fault of the project."""
+    """Runs the recipe. Raises Impossible if the mirror does not answer."""
     made = subprocess.run([*AS_ROOT, "timeout", str(LIMIT_SECONDS), *command],
                           stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
                           stderr=subprocess.STDOUT, text=True)
