@@ -1,18 +1,21 @@
 # clang-tidy as a build step. A file is checked whenever its object has been rebuilt; a stamp beside
 # the object records a clean result.
 find_program(CLANG_TIDY clang-tidy REQUIRED)
+set(tidy_settings .clang-tidy bench/.clang-tidy tests/.clang-tidy)
+list(TRANSFORM tidy_settings PREPEND ${PROJECT_SOURCE_DIR}/)
 
 # tidy(TARGET CHECKS FOLDER...): a target that looks at all that is compiled in these folders and
 # below, with .clang-tidy's checks and these changes to them.
 function(tidy target checks)
   set(stamps)
   foreach(folder IN LISTS ARGN)
-    tidied(${folder})
+    collect_stamps(${folder})
   endforeach()
   add_custom_target(${target} DEPENDS ${stamps})
 endfunction()
 
-function(tidied folder)
+# Adds the stamps of a folder and of those below to the caller's list.
+function(collect_stamps folder)
   get_property(targets DIRECTORY ${folder} PROPERTY BUILDSYSTEM_TARGETS)
   get_property(objects DIRECTORY ${folder} PROPERTY BINARY_DIR)
   foreach(compiled IN LISTS targets)
@@ -26,14 +29,14 @@ function(tidied folder)
         COMMAND ${CLANG_TIDY} --quiet --checks=${checks} -p ${PROJECT_BINARY_DIR}
                 ${folder}/${source}
         COMMAND ${CMAKE_COMMAND} -E touch ${stamp}
-        DEPENDS ${object} ${PROJECT_SOURCE_DIR}/.clang-tidy
+        DEPENDS ${object} ${tidy_settings}
         COMMENT "clang-tidy ${source}" VERBATIM)
       list(APPEND stamps ${stamp})
     endforeach()
   endforeach()
   get_property(below DIRECTORY ${folder} PROPERTY SUBDIRECTORIES)
   foreach(each IN LISTS below)
-    tidied(${each})
+    collect_stamps(${each})
   endforeach()
   set(stamps ${stamps} PARENT_SCOPE)
 endfunction()
