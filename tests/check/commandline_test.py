@@ -7,6 +7,7 @@ import subprocess
 
 import pytest
 
+import terminal
 from configurations import configuration
 
 LIMIT_SECONDS = 60
@@ -130,7 +131,7 @@ def test_only_a_terminal_that_wants_them_gets_colours(run, variables, coloured):
     leader, follower = os.openpty()
     run(text=WARNED, stdout=follower, env={**kept, **variables})
     os.close(follower)
-    shown = os.read(leader, 4096)
+    shown = terminal.read_to_end(leader)
     os.close(leader)
     assert (b"\033[" in shown) == coloured
     assert b"\033" not in run(text=WARNED).stdout.encode()

@@ -1,8 +1,12 @@
 """The option that all tests of the checker take."""
 
 import pathlib
+import sys
 
 import pytest
+
+# For what the tests share.
+sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "support"))
 
 
 def pytest_addoption(parser):

@@ -4,15 +4,13 @@ of them is what the program says of them."""
 import pathlib
 import re
 import subprocess
-import sys
 
 import pytest
 
+import guide
+
 HERE = pathlib.Path(__file__).resolve().parent
 PROJECT = HERE.parents[1]
-sys.path.insert(0, str(PROJECT / "tests" / "support"))
-
-import guide  # noqa: E402 -- needs the path
 
 EXAMPLES = guide.examples("13. Checking a configuration before it is used", "tolkwd-check")
 TIME_LIMIT = 60  # seconds

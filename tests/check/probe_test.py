@@ -10,6 +10,7 @@ import time
 
 import pytest
 
+import terminal
 from configurations import configuration
 
 PROJECT = pathlib.Path(__file__).resolve().parents[2]
@@ -251,7 +252,7 @@ def test_an_interrupt_ends_the_probe_and_runs_nothing_more(sandbox, number, whom
     kill = "kill -%d -- %s$!" % (number, "-" if whom == "group" else "")
     command = sandbox.command(
         f"set -m; tolkwd-check {PROBE} </dev/null &\n"
-        f"until [ -e /opt/stage/calls ]; do sleep 0.05; done\n{kill}\nwait $!")
+        f"until [ -s /opt/stage/calls ]; do sleep 0.05; done\n{kill}\nwait $!")
     begin = time.monotonic()
     # Whoever runs the tests in the background may ignore them, which is inherited.
     played = subprocess.run(command, capture_output=True, timeout=LIMIT_SECONDS,
@@ -282,7 +283,7 @@ def test_a_terminal_shows_what_is_waited_for(sandbox):
     played = subprocess.run(sandbox.command(f"tolkwd-check {PROBE}"), stdin=subprocess.DEVNULL,
                             stdout=subprocess.PIPE, stderr=follower, timeout=LIMIT_SECONDS)
     os.close(follower)
-    shown = os.read(leader, 4096).decode()
+    shown = terminal.read_to_end(leader).decode()
     os.close(leader)
     assert played.returncode == 0
     assert '\rwaiting for the status command of "web"' in shown

@@ -13,6 +13,8 @@ import time
 
 import pytest
 
+import terminal
+
 LIMIT_SECONDS = 60
 ESCAPE = "\x1b[31m"
 
@@ -357,7 +359,7 @@ def terminal_output(program, arguments, columns, variables, log):
     subprocess.run([program, *arguments], input=log, stdout=follower, encoding="utf-8",
                    env={**kept, **ZONE, **variables}, timeout=LIMIT_SECONDS)
     os.close(follower)
-    shown = os.read(leader, 65536).decode()
+    shown = terminal.read_to_end(leader).decode()
     os.close(leader)
     return shown
 

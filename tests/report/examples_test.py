@@ -3,14 +3,12 @@
 import os
 import pathlib
 import subprocess
-import sys
 
 import pytest
 
-HERE = pathlib.Path(__file__).resolve().parent
-sys.path.insert(0, str(HERE.parent / "support"))
+import guide
 
-import guide  # noqa: E402 -- needs the path
+HERE = pathlib.Path(__file__).resolve().parent
 
 EXAMPLES = guide.examples("14. What was up, and what was down", "tolkwd-report")
 TIME_LIMIT = 60  # seconds
