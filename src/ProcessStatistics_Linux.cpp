@@ -129,11 +129,11 @@ Utility::InputFile Utility::OpenToRead(const std::string& path)
     return InputFile(std::fopen(path.c_str(), "re"));
 }
 
-ProcessStatistics::ProcessStatistics(std::string program) : name(program) {}
+ProcessStatistics::ProcessStatistics(std::string program) : name(std::move(program)) {}
 
 void ProcessStatistics::SetName(std::string program)
 {
-    name = std::string_view(program);
+    name = std::move(program);
 }
 
 void ProcessStatistics::SetThresholdAverageCPUUsage(std::string text)

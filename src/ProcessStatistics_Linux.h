@@ -11,8 +11,6 @@
 #include <string>
 #include <vector>
 
-#include "wdtext.h"
-
 // Shell commands, process ids and text. No state; every function may be called from any thread.
 class Utility {
 public:
@@ -95,7 +93,7 @@ private:
     int thresholdAverageCPUUsage = 0; // as averageCPUUsage
     int thresholdThreadCount = 0;
     int thresholdMemoryUsage = 0; // pages
-    wdtext name;
+    std::string name;
     int pid = -1;
     int lastRefreshTime = 0; // seconds since the epoch; 0: no baseline yet
     int lastUserTime = 0;    // clock ticks at that time

@@ -181,4 +181,5 @@ int main(int argc, char** argv)
     wdmanager manager(configPath, wdlocallogpath);
     set_tmp_file_path();
     manager.wdstart();
+    return 0;
 }

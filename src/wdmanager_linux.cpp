@@ -89,9 +89,12 @@ void wdmanager::startgeneration()
     enablemonitoring(true);
     threads.clear();
     threads.reserve(targets.size());
-    for (const wdmonitortarget& watched : targets) {
-        threads.emplace_back(watched);
+    // The threads take the records over: the manager reads its list no more before the next load,
+    // and with a thousand targets it would be a tenth of the daemon's memory.
+    for (wdmonitortarget& watched : targets) {
+        threads.emplace_back(std::move(watched));
     }
+    std::vector<wdmonitortarget>().swap(targets);
     if (pthread_rwlock_init(&pingreclock, nullptr) != 0) {
         wdlog(kModule, kLevelError, "Failed to init the pingreclock.");
         pthread_exit(kNoLock);

@@ -31,17 +31,17 @@ public:
     // Forgets all targets and loads the configuration again. Always 1.
     int refreshconfig();
 
-    // Supervises, one-second tick by tick. Never returns; ends the main thread through
+    // Supervises, one-second tick by tick. Does not return; ends the main thread through
     // pthread_exit, before any monitor thread of the generation exists, when the lock cannot be
     // made.
-    [[noreturn]] void wdstart();
+    void wdstart();
 
 private:
     void startgeneration();
     void stopgeneration();
 
     std::string configfile;
-    std::vector<wdmonitortarget> targets;
+    std::vector<wdmonitortarget> targets; // until the threads of a generation take them over
 
     // Running threads work on these very elements: all are here before the first one starts, and
     // the vector stays as it is until all are joined.

@@ -99,10 +99,11 @@ std::string redirected(std::string command, const std::string& file)
 
 std::string statuscommand(const service& svc, const std::string& file)
 {
-    return redirected("service " + svc.name.str() + " status", file);
+    return redirected("service " + svc.name + " status", file);
 }
 
-// Runs the command and takes what its output, in the file `path`, holds up to the first newline.
+// Runs the command and takes what its output, in the file `path`, holds up to the first newline,
+// or kLongestAnswerBytes of it: a check that prints without end must not take all memory.
 pingoutcome ask(std::string command, const std::string& path)
 {
     pingoutcome outcome{.command = std::move(command)};
@@ -179,12 +180,12 @@ unsigned pauseseconds(long interval) noexcept
 
 std::string statusfile(const service& svc)
 {
-    return _tmp_file_path + "agent." + svc.name.str();
+    return _tmp_file_path + "agent." + svc.name;
 }
 
 std::string functionalfile(const service& svc)
 {
-    return _tmp_file_path + "agent.functionalping." + svc.name.str();
+    return _tmp_file_path + "agent.functionalping." + svc.name;
 }
 
 std::string statuscommand(const service& svc)
@@ -199,12 +200,12 @@ std::string functionalcommand(const service& svc)
 
 std::string stopcommand(const service& svc)
 {
-    return svc.stopcmd == kNoCommand ? "service " + svc.name.str() + " stop" : svc.stopcmd.str();
+    return svc.stopcmd == kNoCommand ? "service " + svc.name + " stop" : svc.stopcmd;
 }
 
 std::string startcommand(const service& svc)
 {
-    return svc.startcmd == kNoCommand ? "service " + svc.name.str() + " start" : svc.startcmd.str();
+    return svc.startcmd == kNoCommand ? "service " + svc.name + " start" : svc.startcmd;
 }
 
 pingoutcome askstatus(const service& svc)
@@ -360,7 +361,7 @@ int wdmonitorthread::functionalping()
     }
     const service& svc = montarget.monitoredservice;
     wdlog(kModule, kLevelDebug, "Performing functional ping, process id is: ", getpid(),
-          ", fp cmd is: ", svc.functionalpingcmd.str());
+          ", fp cmd is: ", svc.functionalpingcmd);
     if (svc.functionalpingcmd == kNoCommand) {
         return kFunctionalPingRefused;
     }

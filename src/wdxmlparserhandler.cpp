@@ -24,7 +24,7 @@ constexpr const char* kLimitsModule = "wdxmlparserhandler";
 
 // The field that an element of this name fills, or null. Most files give the fields in this order:
 // the search begins behind the field found before.
-wdtext service::*fieldnamed(std::string_view element)
+std::string service::*fieldnamed(std::string_view element)
 {
     static std::size_t next = 0;
     for (std::size_t i = 0; i < kFieldElements.size(); ++i) {
@@ -39,10 +39,10 @@ wdtext service::*fieldnamed(std::string_view element)
 
 // A field element has ended and left the stack. Only what directly encloses it decides whose field
 // it is; anywhere but in wdmonitorservice it is the dependent service's.
-void storefield(wdtext service::*field)
+void storefield(std::string service::*field)
 {
     const bool monitored = !xercecstack.empty() && xercecstack.top() == "wdmonitorservice"sv;
-    (monitored ? monitorservice : monservicedep).*field = std::string_view(charparse);
+    (monitored ? monitorservice : monservicedep).*field = charparse;
 }
 
 void storetarget()
@@ -152,7 +152,7 @@ void collectservices()
     xmlparser::allservices.clear();
     std::unordered_set<std::string_view> names;
     const auto add = [&names](const service& candidate) {
-        if (names.insert(candidate.name.str()).second) {
+        if (names.insert(candidate.name).second) {
             xmlparser::allservices.push_back(candidate);
         }
     };

@@ -26,7 +26,7 @@
 // A field element's name and the field that it fills.
 struct fieldelement {
     std::string_view name;
-    wdtext service::*field;
+    std::string service::*field;
 };
 
 // All that there are.

@@ -1,7 +1,6 @@
 #include "xmlparser.h"
 
 #include "wdxmlparserhandler.h"
-#include "xmlscan.h"
 
 std::vector<service> xmlparser::allservices;
 std::vector<wdmonitortarget> xmlparser::alltargets;

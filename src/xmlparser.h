@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "wdmonitortarget.h"
+#include "xmlscan.h" // whoever reads a configuration also knows `control`
 
 class xmlparser {
 public:

@@ -15,7 +15,7 @@ constexpr int kBlockBytes = 65536;
 
 struct fieldelement {
     std::string_view name;
-    wdtext service::*field;
+    std::string service::*field;
     std::string_view value; // what configurationtext() writes; empty: made from the service's name
 };
 
@@ -38,7 +38,7 @@ constexpr std::array<fieldelement, 16> kFields{{
     {"ThresholdHandleCount", &service::ThresholdHandleCount, "1000"},
 }};
 
-wdtext service::*fieldnamed(std::string_view name)
+std::string service::*fieldnamed(std::string_view name)
 {
     const auto* found = std::find_if(kFields.begin(), kFields.end(),
                                      [&](const auto& known) { return known.name == name; });

@@ -43,15 +43,15 @@ TEST_F(DaemonView, TellsWhereValuesComeFrom)
     EXPECT_EQ(target.end, in(text, "</wdmonitortarget>"));
     EXPECT_EQ(target.monitored.begin, in(text, "<wdmonitorservice>"));
     EXPECT_EQ(target.monitored.end, in(text, "</wdmonitorservice>"));
-    EXPECT_EQ(target.monitored.record->name.str(), "web");
+    EXPECT_EQ(target.monitored.record->name, "web");
     EXPECT_EQ(target.monitored.origins[name].element, in(text, "<name>"));
     EXPECT_EQ(target.monitored.origins[name].text, in(text, "web"));
-    EXPECT_EQ(target.monitored.record->startcmd.str(), ">");
+    EXPECT_EQ(target.monitored.record->startcmd, ">");
     EXPECT_EQ(target.monitored.origins[startcmd].element, in(text, "<startcmd>"));
     EXPECT_EQ(target.monitored.origins[startcmd].text, in(text, "</name>") + 6);
     ASSERT_EQ(target.dependents.size(), 1U);
     EXPECT_EQ(target.dependents[0].begin, in(text, "<wdmondependsev>"));
-    EXPECT_EQ(target.dependents[0].record->name.str(), "db");
+    EXPECT_EQ(target.dependents[0].record->name, "db");
     EXPECT_EQ(target.dependents[0].origins[name].text, in(text, "db"));
     EXPECT_EQ(target.dependents[0].origins[startcmd].element, kNoPlace);
 }
@@ -64,9 +64,9 @@ TEST_F(DaemonView, CarriedValuesKeepTheirOrigin)
         "</wdmonitorservice></wdmonitortarget><wdmonitortarget></wdmonitortarget></wdtargets>";
     const daemonview view = readasdaemon(text);
     ASSERT_EQ(view.targets.size(), 3U);
-    EXPECT_EQ(view.targets[1].monitored.record->startcmd.str(), "go");
+    EXPECT_EQ(view.targets[1].monitored.record->startcmd, "go");
     EXPECT_EQ(view.targets[1].monitored.origins[startcmd].text, in(text, "go"));
-    EXPECT_EQ(view.targets[2].monitored.record->name.str(), "db");
+    EXPECT_EQ(view.targets[2].monitored.record->name, "db");
     EXPECT_EQ(view.targets[2].monitored.begin, kNoPlace);
 }
 
@@ -77,7 +77,7 @@ TEST_F(DaemonView, AFieldOutsideAServiceIsTheNextDependents)
         "<name>lost</name><wdmondependsev></wdmondependsev></wdmonitortarget></wdtargets>";
     const targetview target = readasdaemon(text).targets.at(0);
     EXPECT_EQ(target.monitored.origins[name].text, in(text, "web"));
-    EXPECT_EQ(target.dependents.at(0).record->name.str(), "lost");
+    EXPECT_EQ(target.dependents.at(0).record->name, "lost");
     EXPECT_EQ(target.dependents.at(0).origins[name].element, in(text, "<name>", 2));
     EXPECT_EQ(target.dependents.at(0).origins[name].text, in(text, "lost"));
 }
@@ -88,7 +88,7 @@ TEST_F(DaemonView, EachReadingIsThatOfADaemonThatHasJustStarted)
     const daemonview view =
         readasdaemon("<wdtargets><wdmonitortarget></wdmonitortarget></wdtargets>");
     ASSERT_EQ(view.targets.size(), 1U);
-    EXPECT_EQ(view.targets[0].monitored.record->name.str(), "");
+    EXPECT_EQ(view.targets[0].monitored.record->name, "");
     EXPECT_TRUE(view.neverclosed.empty());
 }
 

@@ -49,7 +49,7 @@ Record recordof(const service& svc)
 {
     Record record;
     for (const fieldelement& field : kFieldElements) {
-        record[std::string(field.name)] = (svc.*field.field).str();
+        record[std::string(field.name)] = svc.*field.field;
     }
     return record;
 }

@@ -195,7 +195,7 @@ bool samerecord(const json& told, const service& record)
 {
     return told.size() == kFieldElements.size() &&
            std::all_of(kFieldElements.begin(), kFieldElements.end(), [&](const auto& field) {
-               return bytesof(told.at(std::string(field.name))) == (record.*field.field).str();
+               return bytesof(told.at(std::string(field.name))) == record.*field.field;
            });
 }
 
@@ -224,7 +224,7 @@ std::size_t bytesofrecords()
     const auto bytes = [](const service& record) {
         std::size_t sum = sizeof(service);
         for (const fieldelement& field : kFieldElements) {
-            sum += (record.*field.field).str().size();
+            sum += (record.*field.field).size();
         }
         return sum;
     };

@@ -24,7 +24,7 @@ constexpr char kSeparator = '\x1e';
 
 struct Field {
     const char* element;
-    wdtext service::*value;
+    std::string service::*value;
 };
 
 constexpr std::array<Field, 16> kFields{{

@@ -6,7 +6,7 @@
 
 namespace {
 
-constexpr std::array<wdtext service::*, 16> kTexts{
+constexpr std::array<std::string service::*, 16> kTexts{
     &service::name,
     &service::binarypath,
     &service::startcmd,

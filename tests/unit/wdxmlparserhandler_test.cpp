@@ -142,18 +142,6 @@ TEST_F(Handler, DocumentWithADependentFillsEveryFieldOfBoth)
     expectfull(xmlparser::allservices[1], "datastore", "-d");
 }
 
-// Most values are the same in every service; a thousand targets hold them once.
-TEST_F(Handler, SameValuesOfTwoServicesAreHeldOnce)
-{
-    load(document(targetof(fullservice("wdmonitorservice", "a", "")) +
-                  targetof(fullservice("wdmonitorservice", "b", ""))));
-    const auto& targets = xmlparser::alltargets;
-    ASSERT_EQ(targets.size(), 2U);
-    EXPECT_EQ(&targets[0].monitoredservice.startcmd.str(),
-              &targets[1].monitoredservice.startcmd.str());
-    EXPECT_EQ(&targets[0].monitoredservice.name.str(), &xmlparser::allservices[0].name.str());
-}
-
 TEST_F(Handler, FieldsMayComeInAnyOrder)
 {
     for (const auto* name : {"ThresholdHandleCount", "name", "name", "stopcmd", "startcmd"}) {

@@ -33,12 +33,12 @@ std::string runinstead(const serviceview& view, field which)
     }
     const std::string verb = which == &service::startcmd ? "start" : "stop";
     return "a command: nothing " + verb + "s the service; only NULL, in these four letters, is " +
-           tools::inquotes("service " + view.record->name.str() + " " + verb);
+           tools::inquotes("service " + view.record->name + " " + verb);
 }
 
 void checkspelling(const serviceview& view, field which, findings& found)
 {
-    if (isown(view, which) && isnullspelling((view.record->*which).str())) {
+    if (isown(view, which) && isnullspelling(view.record->*which)) {
         found.add("null-spelling", severity::error, placeof(view, which),
                   valueof(view, which) + ", which is run as " + runinstead(view, which));
     }
@@ -61,13 +61,13 @@ void checkend(const serviceview& view, field which, findings& found)
 void checkmonitoredempty(const serviceview& view, findings& found)
 {
     const service& record = *view.record;
-    if (isown(view, &service::startcmd) && doesnothing(record.startcmd.str())) {
+    if (isown(view, &service::startcmd) && doesnothing(record.startcmd)) {
         found.add("empty-command", severity::warning, placeof(view, &service::startcmd),
                   valueof(view, &service::startcmd) +
                       ", which does nothing: a recovery stops the service and nothing starts it; "
                       "NULL is \"service NAME start\"");
     }
-    if (isown(view, &service::functionalpingcmd) && doesnothing(record.functionalpingcmd.str())) {
+    if (isown(view, &service::functionalpingcmd) && doesnothing(record.functionalpingcmd)) {
         found.add("empty-command", severity::error, placeof(view, &service::functionalpingcmd),
                   valueof(view, &service::functionalpingcmd) +
                       ", which prints nothing: that is a failed check, so the service is "
@@ -85,7 +85,7 @@ void checkdependent(const serviceview& view, findings& found)
 {
     const service& record = *view.record;
     const std::string& start = record.startcmd;
-    if (!isown(view, &service::startcmd) || doesnothing(record.stopcmd.str())) {
+    if (!isown(view, &service::startcmd) || doesnothing(record.stopcmd)) {
         return;
     }
     if (doesnothing(start)) {
@@ -126,7 +126,7 @@ void checkbounds(const serviceview& view, bool monitored, findings& found)
     }
     if (!unbounded.empty()) {
         found.add("unbounded-command", severity::note, placeof(view, &service::name),
-                  "no time limit for " + unbounded + " of " + tools::inquotes(record.name.str()) +
+                  "no time limit for " + unbounded + " of " + tools::inquotes(record.name) +
                       ": while one of them hangs, no service is recovered; put \"timeout -k 5 60\" "
                       "before what may hang");
     }

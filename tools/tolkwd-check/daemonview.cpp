@@ -175,7 +175,7 @@ std::size_t fieldindex(std::string_view name) noexcept
     return static_cast<std::size_t>(found - kFieldElements.begin());
 }
 
-std::size_t fieldindex(wdtext service::*field) noexcept
+std::size_t fieldindex(std::string service::*field) noexcept
 {
     const auto* const found =
         std::find_if(kFieldElements.begin(), kFieldElements.end(),

@@ -52,7 +52,7 @@ struct daemonview {
 std::size_t fieldindex(std::string_view name) noexcept;
 
 // The index of the field that is this member.
-std::size_t fieldindex(wdtext service::*field) noexcept;
+std::size_t fieldindex(std::string service::*field) noexcept;
 
 // Reads `text` as a daemon does that has just started; xmlparser::alltargets and allservices hold
 // the result until the next call. Raises std::system_error where the system does not let it.

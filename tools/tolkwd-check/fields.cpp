@@ -57,12 +57,12 @@ std::size_t placeof(const serviceview& view, field which) noexcept
 
 std::string fieldof(const serviceview& view, field which)
 {
-    return std::string(fieldname(which)) + " of " + tools::inquotes(view.record->name.str());
+    return std::string(fieldname(which)) + " of " + tools::inquotes(view.record->name);
 }
 
 std::string valueof(const serviceview& view, field which)
 {
-    return fieldof(view, which) + " is " + tools::inquotes((view.record->*which).str());
+    return fieldof(view, which) + " is " + tools::inquotes(view.record->*which);
 }
 
 std::string shortnumber(double value)

@@ -10,7 +10,7 @@
 
 namespace check {
 
-using field = wdtext service::*;
+using field = std::string service::*;
 
 // As the configuration names it. Any thread.
 std::string_view fieldname(field which) noexcept;

@@ -36,7 +36,7 @@ ordered_json recordjson(const service& record)
 {
     ordered_json result = ordered_json::object();
     for (const fieldelement& field : kFieldElements) {
-        result[std::string(field.name)] = tools::textjson((record.*field.field).str());
+        result[std::string(field.name)] = tools::textjson(record.*field.field);
     }
     return result;
 }

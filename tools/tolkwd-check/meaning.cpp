@@ -7,7 +7,7 @@ namespace check {
 
 namespace {
 
-bool isone(std::size_t field, wdtext service::*one)
+bool isone(std::size_t field, std::string service::*one)
 {
     return kFieldElements.at(field).field == one;
 }

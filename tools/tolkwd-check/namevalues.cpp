@@ -100,7 +100,7 @@ public:
     void take(const serviceview& view)
     {
         const service& record = *view.record;
-        if (!isown(view, &service::name) || !isplainname(record.name.str())) {
+        if (!isown(view, &service::name) || !isplainname(record.name)) {
             return;
         }
         use(view, statusfile(record));
@@ -137,10 +137,10 @@ public:
         if (!isown(view, &service::name)) {
             return;
         }
-        bool& watched = known[record.name.str()].watched;
+        bool& watched = known[record.name].watched;
         if (monitored && watched) {
             found.add("duplicate-service", severity::error, placeof(view, &service::name),
-                      tools::inquotes(record.name.str()) +
+                      tools::inquotes(record.name) +
                           " is watched by an earlier target already: both ask it through one file "
                           "and both recover it; watch each service in one target only");
         }
@@ -165,7 +165,7 @@ private:
         if (!isown(view, which)) {
             return;
         }
-        entry& names = known[view.record->name.str()];
+        entry& names = known[view.record->name];
         said& first = which == &service::startcmd ? names.start : names.stop;
         if (first.command.empty()) {
             first = {command, monitored};

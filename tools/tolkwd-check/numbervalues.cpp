@@ -109,7 +109,7 @@ class numbercheck {
 public:
     numbercheck(const serviceview& checked, const numberfield& looked, findings& collected)
         : view(checked), known(looked), found(collected), number(numberof(checked, looked)),
-          text(cut((checked.record->*looked.which).str()))
+          text(cut(checked.record->*looked.which))
     {
     }
 

@@ -70,8 +70,7 @@ commandprobe trystatus(const service& svc)
     const auto begin = clocktype::now();
     pingoutcome outcome = askstatus(svc);
     const double seconds = secondssince(begin);
-    commandprobe tried =
-        madeof("service " + svc.name.str() + " status", std::move(outcome), seconds);
+    commandprobe tried = madeof("service " + svc.name + " status", std::move(outcome), seconds);
     rate(tried, ratestatus(tried.firstline, tried.state),
          statusreason(tried.firstline, tried.state));
     return tried;
@@ -90,7 +89,7 @@ commandprobe trycheck(const service& svc)
 // The figures of a target's process, taken twice, for the processor's is one over time.
 class processreading {
 public:
-    explicit processreading(const service& svc) : path(svc.binarypath.str())
+    explicit processreading(const service& svc) : path(svc.binarypath)
     {
         statistics.SetName(path);
         statistics.SetThresholdAverageCPUUsage(svc.ThresholdAverageCPUUsage);

@@ -173,8 +173,7 @@ std::optional<std::string> probequestion(const daemonview& view)
     std::string commands;
     for (const targetview& target : view.targets) {
         if (ischecked(*target.monitored.record) && ++checks <= kShownChecks) {
-            commands +=
-                "  " + tools::inquotes(target.monitored.record->functionalpingcmd.str()) + '\n';
+            commands += "  " + tools::inquotes(target.monitored.record->functionalpingcmd) + '\n';
         }
     }
     if (checks > kShownChecks) {

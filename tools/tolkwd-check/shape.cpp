@@ -29,7 +29,7 @@ std::string_view nameof(std::size_t field)
     return kFieldElements.at(field).name;
 }
 
-const wdtext& valueof(const service& record, std::size_t field)
+const std::string& valueof(const service& record, std::size_t field)
 {
     return record.*kFieldElements.at(field).field;
 }
@@ -415,7 +415,7 @@ private:
             if (written == nullptr || !taken.emplace(written, &each).second) {
                 const std::size_t before = oddwithin(0, each.end).second;
                 harm(before > 0 ? before - 1 : npos, each.begin,
-                     "a service named " + tools::inquotes(each.monitored.record->name.str()) +
+                     "a service named " + tools::inquotes(each.monitored.record->name) +
                          " is watched, which nobody meant");
             }
         }
@@ -470,7 +470,7 @@ private:
         std::map<std::size_t, changedfields> changed; // by the oddity to blame
         for (std::size_t field = 0; field < kFields; ++field) {
             const writtenfield* each = written.find(field);
-            const std::string& value = valueof(*taken.record, field).str();
+            const std::string& value = valueof(*taken.record, field);
             if (each != nullptr && !each->value.empty() && each->value == value) {
                 continue;
             }
@@ -512,7 +512,7 @@ private:
 
     void tellmissing(const writtenservice& written, std::size_t field, const serviceview& taken)
     {
-        const std::string& value = valueof(*taken.record, field).str();
+        const std::string& value = valueof(*taken.record, field);
         const origin& from = taken.origins.at(field);
         const std::string effect = effectof(field, value);
         std::string message = std::string(nameof(field)) + " is missing in " +
@@ -523,7 +523,7 @@ private:
                        (effect.empty() ? "" : ": " + effect);
         } else {
             const service& last = written.monitored ? monitorservice : monservicedep;
-            const std::string& later = valueof(last, field).str();
+            const std::string& later = valueof(last, field);
             message += "at the start it is empty" + (effect.empty() ? "" : " (" + effect + ")");
             if (!later.empty()) {
                 message += ", after a refresh " + tools::inquotes(later) + ", as in the last " +
@@ -561,7 +561,7 @@ private:
 
     void tellmissingservice(const writtentarget& written, const targetview& taken)
     {
-        const std::string& name = taken.monitored.record->name.str();
+        const std::string& name = taken.monitored.record->name;
         found.add("missing-service", severity::error, written.begin,
                   "the target has no " + tag("wdmonitorservice") +
                       (name.empty() ? ": it watches a service without a name"
