@@ -33,6 +33,13 @@ int ticksperkilosecond(int fromTicks, int toTicks, int fromTime, int toTime)
     return static_cast<std::int32_t>(std::int64_t{ticks} / seconds);
 }
 
+constexpr int kFetchFailed = 1;
+
+void logfetchfailure(const std::string& name)
+{
+    wdlog(kModule, kLevelError, "(", name, ") Unable to fetch stats of process from system");
+}
+
 // All that the pipe delivers, of each piece what stands before a NUL byte. Reads on after an
 // interruption and stops at any other error. Not fgets: when it is interrupted, what it has read of
 // the piece is lost.
@@ -196,14 +203,13 @@ void ProcessStatistics::UpdatePID()
 int ProcessStatistics::FetchStatisticsFromSystem(std::vector<std::string>& fields)
 {
     const auto file = Utility::OpenToRead("/proc/" + std::to_string(pid) + "/stat");
+    if (!file) {
+        logfetchfailure(name);
+        return kFetchFailed;
+    }
     // Cut at every blank. A blank within the program's name shifts the fields behind it; that is
     // known, and which figures a check then compares must not change under an operator's feet.
-    auto found = file ? Utility::split(readstat(file.get()), ' ') : std::vector<std::string>();
-    if (found.size() < kLeastFields) {
-        wdlog(kModule, kLevelError, "(", name, ") Unable to fetch stats of process from system");
-        return 1;
-    }
-    fields = std::move(found);
+    fields = Utility::split(readstat(file.get()), ' ');
     return 0;
 }
 
@@ -212,6 +218,10 @@ int ProcessStatistics::Refresh()
     std::vector<std::string> fields;
     if (const int failure = FetchStatisticsFromSystem(fields); failure != 0) {
         return failure;
+    }
+    if (fields.size() < kLeastFields) {
+        logfetchfailure(name);
+        return kFetchFailed;
     }
     const auto now = static_cast<int>(time(nullptr));
     const int userTime = Utility::str2int(fields[kUserTimeField]);

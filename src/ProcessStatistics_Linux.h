@@ -73,12 +73,13 @@ public:
     // Looks the process up again; a new id, or none (0), makes the next Refresh a fresh baseline.
     void UpdatePID();
 
-    // Replaces `fields` by the blank-separated fields of the process's stat file and returns 0.
-    // Where the file cannot be read, or is too short to hold the figures: logs an ERROR, leaves
-    // `fields` alone and returns 1.
+    // Replaces `fields` by the blank-separated fields of the process's stat file, however many
+    // there are, and returns 0. Where the file cannot be opened: logs an ERROR, leaves `fields`
+    // alone and returns 1.
     int FetchStatisticsFromSystem(std::vector<std::string>& fields);
 
-    // Takes new figures. Returns the result of FetchStatisticsFromSystem; on 1 nothing changes.
+    // Takes new figures and returns 0. Where the stat file cannot be opened or is too short to
+    // hold them: an ERROR in the log, 1, and nothing changes.
     int Refresh();
 
     // Looks the process up, takes new figures and tells whether one of them is above its

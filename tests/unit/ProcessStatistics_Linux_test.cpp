@@ -561,6 +561,15 @@ TEST_F(Statistics, FailedFetchLeavesTheCallersFields)
     EXPECT_EQ(stats.Refresh(), 1);
 }
 
+TEST_F(Statistics, FetchReplacesTheFieldsHoweverFew)
+{
+    statis("42 (web)");
+    stats.UpdatePID();
+    std::vector<std::string> fields{"old", "older", "oldest"};
+    EXPECT_EQ(stats.FetchStatisticsFromSystem(fields), 0);
+    EXPECT_EQ(fields, (Pieces{"42", "(web)"}));
+}
+
 // Ends the file at its 24th field.
 std::string cutafterpages(const std::string& content)
 {
@@ -576,6 +585,22 @@ TEST_F(Statistics, FewerThanTwentyFourFieldsAreAFailedFetch)
     world.now += 10;
     EXPECT_EQ(check(), "ERROR (web) Unable to fetch stats of process from system\n" +
                            figures(0, 51, 1, true));
+}
+
+TEST_F(Statistics, RefreshByTooFewFieldsChangesNothing)
+{
+    cpuafter(5, 10);
+    const std::string whole = cutafterpages(stat("900", "7", "8"));
+    statis(whole.substr(0, whole.rfind(' ')));
+    world.now += 10;
+    EXPECT_NE(stats.Refresh(), 0);
+    EXPECT_EQ(stats.GetAverageCPUUsage(), 500);
+    EXPECT_EQ(stats.GetNumberOfThreads(), 1);
+    EXPECT_EQ(stats.GetMemoryUsage(), 1);
+    statis(stat("7", "1", "1"));
+    world.now += 10;
+    EXPECT_EQ(stats.Refresh(), 0);
+    EXPECT_EQ(stats.GetAverageCPUUsage(), 100); // 2 ticks in 20 seconds: the baseline has stayed
 }
 
 TEST_F(Statistics, TwentyFourFieldsAreEnough)
