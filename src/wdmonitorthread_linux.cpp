@@ -113,8 +113,9 @@ pingoutcome ask(std::string command, const std::string& path)
     std::array<char, kReadBlockBytes> block; // read() fills what is taken from it
     for (auto piece = file.read(block); !piece.empty(); piece = file.read(block)) {
         const std::size_t newline = piece.find('\n');
-        outcome.firstline.append(piece.substr(0, newline));
-        if (newline != std::string_view::npos) {
+        const std::size_t room = kLongestAnswerBytes - outcome.firstline.size();
+        outcome.firstline.append(piece.substr(0, std::min(newline, room)));
+        if (newline != std::string_view::npos || piece.size() >= room) {
             break;
         }
     }

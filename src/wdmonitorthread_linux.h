@@ -20,6 +20,7 @@
 // ping gives kGeneralPingRefused, and so a recovery stops and starts everything it has.
 #pragma once
 
+#include <cstddef>
 #include <string>
 
 #include <pthread.h>
@@ -77,12 +78,15 @@ std::string functionalcommand(const service& svc);
 std::string stopcommand(const service& svc);
 std::string startcommand(const service& svc);
 
+// So much of the first line of an answer is kept; the rest of the line is ignored.
+inline constexpr std::size_t kLongestAnswerBytes = 1048576;
+
 // What came of the command of a ping.
 struct pingoutcome {
     std::string command{};   // as the shell got it
     int state = -1;          // its exit status, or -1 where it did not end normally
     bool opened = false;     // whether the file with its output could be opened
-    std::string firstline{}; // of this output; empty where there is none
+    std::string firstline{}; // of this output, at most kLongestAnswerBytes; empty if there is none
 };
 
 // Runs the status command, or the functional check, of `svc` and reads what it printed, in the file

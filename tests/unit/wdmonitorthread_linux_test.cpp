@@ -1029,6 +1029,14 @@ TEST_F(GeneralPing, LongFirstLineCountsToItsEnd)
     EXPECT_EQ(rate(std::string(1000, '.') + " running\nstopped\n", 1), 0);
 }
 
+TEST_F(GeneralPing, FirstLineCountsToItsFirstMiB)
+{
+    const std::string word = "running";
+    EXPECT_EQ(rate(std::string(kLongestAnswerBytes - word.size(), '.') + word, 1), 0);
+    EXPECT_EQ(rate(std::string(kLongestAnswerBytes - word.size() + 1, '.') + word, 1), 3);
+    EXPECT_EQ(rate(std::string(kLongestAnswerBytes, '.') + "\nrunning\n", 1), 3);
+}
+
 TEST_F(GeneralPing, ExitStatusDecidesWhereNoWordDoes)
 {
     EXPECT_EQ(rate("active", 0), 0);
@@ -1195,6 +1203,13 @@ TEST_F(FunctionalPing, AnythingElseIsAFailure)
 TEST_F(FunctionalPing, OnlyTheFirstLineCounts)
 {
     EXPECT_EQ(rate("\nCreationClassName\n"), 3);
+}
+
+TEST_F(FunctionalPing, FirstLineCountsToItsFirstMiB)
+{
+    const std::string word = "service:";
+    EXPECT_EQ(rate(std::string(kLongestAnswerBytes - word.size(), '.') + word), 0);
+    EXPECT_EQ(rate(std::string(kLongestAnswerBytes - word.size() + 1, '.') + word), 3);
 }
 
 TEST_F(FunctionalPing, ExitStatusIsIgnored)
