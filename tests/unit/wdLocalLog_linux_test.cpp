@@ -613,6 +613,35 @@ TEST_F(LogThatIsAPipe, IsWaitedForOnceThoughStandardOutputIsAFile)
     EXPECT_EQ(world.events(), lines(std::vector<std::string>(10, "wait 500 ms")));
 }
 
+class LogOfAFreshProcess : public DaemonTest {
+protected:
+    LogOfAFreshProcess() : DaemonTest("m") {}
+};
+
+TEST_F(LogOfAFreshProcess, IsWaitedForByTheVeryFirstLine)
+{
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(
+        {
+            const std::string pipe = folder.path("pipe");
+            mkfifo(pipe.c_str(), 0600);
+            const int reader = open(pipe.c_str(), O_RDONLY | O_NONBLOCK);
+            const int filler = open(pipe.c_str(), O_WRONLY | O_NONBLOCK);
+            while (write(filler, "x", 1) > 0) {
+            }
+            wdLocalLog::logFilePath = pipe;
+            world.recordpolls = true;
+            world.readerneverreads = true;
+            wdLocalLog::LogMessage("m", kLevelInfo, "x");
+            wdLocalLog::logFilePath = folder.path("log");
+            close(reader);
+            const bool waited =
+                world.events() == lines(std::vector<std::string>(10, "wait 500 ms"));
+            _exit(waited ? 7 : 8);
+        },
+        ::testing::ExitedWithCode(7), "");
+}
+
 using LocalLogDeath = LocalLog;
 
 TEST_F(LocalLogDeath, PipeWithoutReaderCannotBeOpened)

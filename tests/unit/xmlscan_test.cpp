@@ -51,6 +51,18 @@ TEST_F(Scan, PlacesGoOnInALongFile)
     EXPECT_EQ(tokens[8], "400014 wdtargets");
 }
 
+// The first mark after the text's start decides where a declaration leads to, long after the scan
+// has finished with it; here it is the first byte of the second piece that is read.
+TEST_F(Scan, FirstMarkIsKnownWhereverAPieceOfTheFileBegins)
+{
+    constexpr std::size_t kPieceBytes = 65536;
+    const std::string first = "<a>" + std::string(kPieceBytes - 3, 'x') + "?</a>";
+    std::string rest(10 * kPieceBytes, ' ');
+    const Tokens tokens = read(first + rest + "<?b>" + rest + "?</wdtargets>");
+    ASSERT_EQ(tokens.size(), 7U);
+    EXPECT_EQ(tokens[4], std::to_string(first.size() + rest.size()) + " ?b");
+}
+
 TEST_F(Scan, TagWithoutANameTellsWhereItIs)
 {
     try {
