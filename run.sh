@@ -44,7 +44,7 @@ The log is kept. To read it as a table, or as a page in a browser:
 
 Not built yet: tolkwd-check, which checks a configuration, and the manual pages.
     cmake --build build/release     builds them (a minute)
-    packaging/build.sh              builds everything and makes packages of it
+    packaging/build.sh              builds everything and makes a Debian package of it
 TEXT
     exit
 fi

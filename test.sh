@@ -12,7 +12,7 @@ case "$*" in
     *) fail 'usage: test.sh [--full]' ;;
 esac
 
-groups=(build demo package test)
+groups=(build demo deb rpm test)
 [ "$full" = OFF ] || groups+=(bench)
 setup "${groups[@]}"
 

@@ -1,15 +1,19 @@
 #!/usr/bin/env bash
-# build.sh: makes the Debian package and the RPM, after installing what that needs, and leaves them
-# in build/packages/.
+# build.sh [rpm]: makes the Debian package, or with "rpm" the RPM, after installing what that needs,
+# and leaves it in build/packages/.
 set -euo pipefail
 # shellcheck source=scripts/setup.sh
 . "$(dirname "$0")/../scripts/setup.sh"
 
-setup build package
+case "$*" in
+    '') kind=deb ;;
+    rpm) kind=rpm ;;
+    *) fail 'usage: packaging/build.sh [rpm]' ;;
+esac
+
+setup build "$kind"
 build release all -DBUILD_TESTING=OFF
 cd "$root"
-for kind in DEB RPM; do
-    cpack -G "$kind"
-done
+cpack -G "${kind^^}"
 printf '\nin %s:\n' "$root/build/packages"
-find build/packages -maxdepth 1 -type f -printf '%f\n' | sort
+find build/packages -maxdepth 1 -name "*.$kind" -printf '%f\n' | sort
