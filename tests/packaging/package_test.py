@@ -290,6 +290,24 @@ def test_another_process_with_its_number_is_no_watchdog(machine, packed):
 
 
 @on_a_machine
+@pytest.mark.parametrize("mode", ["755", "4755"], ids=["plain", "set-user-id"])
+def test_a_users_process_with_its_number_and_its_name_is_no_watchdog(machine, packed, mode):
+    set_up(machine, packed("DEB"))
+    machine.run("service tolkwd stop")
+    machine.run(f"cp /bin/sleep /usr/local/bin/sleeper && chmod {mode} /usr/local/bin/sleeper")
+    posing = machine.run(
+        f"setpriv --reuid nobody --clear-groups bash -c 'exec -a {PINGS}/tolkwd"
+        " /usr/local/bin/sleeper 1000 >/dev/null 2>&1 & echo $!' | tee /run/tolkwd.pid").strip()
+    machine.await_success(f"grep -qF {PINGS}/tolkwd /proc/{posing}/cmdline"
+                          f" && ! grep -qF bash /proc/{posing}/comm")
+
+    assert "tolkwd is not running" in machine.run("service tolkwd status", expect=1)
+    assert "tolkwd started" in machine.run("service tolkwd start")
+    assert daemon(machine) != posing
+    machine.run(f"service tolkwd stop; kill -0 {posing}")
+
+
+@on_a_machine
 def test_commands_are_asked_in_english(machine, packed):
     set_up(machine, packed("DEB"))
     machine.run("service tolkwd stop; LC_ALL=C.UTF-8 /etc/init.d/tolkwd start")
