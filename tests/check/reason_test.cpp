@@ -1,6 +1,7 @@
 #include "reason.h"
 
 #include <array>
+#include <ctime>
 #include <random>
 #include <string>
 #include <string_view>
@@ -131,6 +132,19 @@ TEST_F(Reason, TellsInsideWhatAWordStands)
 TEST_F(Reason, PrefersTheWordThatStandsAlone)
 {
     EXPECT_EQ(statusreason("notifyd is not running", 3).text, R"(contains "not" and "running")");
+    EXPECT_EQ(answerreason("microservice:service: ok").text, R"(contains "service:")");
+}
+
+// A minute of processor time where each occurrence is followed to both ends of the line.
+TEST_F(Reason, TakesATimeThatGrowsAsTheLineDoes)
+{
+    std::string line;
+    while (line.size() < std::size_t{1} << 20U) {
+        line += "running";
+    }
+    const std::clock_t begin = std::clock();
+    EXPECT_EQ(answerreason(line).verdict, kAnswerCorrect);
+    EXPECT_LT(std::clock() - begin, 10 * CLOCKS_PER_SEC);
 }
 
 TEST_F(Reason, TellsWhatTakesAWordItsMeaning)

@@ -82,8 +82,7 @@ std::string_view wholeword(std::string_view line, std::string_view word, std::si
 std::string asfound(std::string_view line, std::string_view word)
 {
     std::string_view first;
-    for (std::size_t place = line.find(word); place != std::string_view::npos;
-         place = line.find(word, place + 1)) {
+    for (std::size_t place = line.find(word); place != std::string_view::npos;) {
         const std::string_view whole = wholeword(line, word, place);
         if (whole == word) {
             return tools::inquotes(word);
@@ -91,6 +90,9 @@ std::string asfound(std::string_view line, std::string_view word)
         if (first.empty()) {
             first = whole;
         }
+        // Once more inside the same whole, it would be no word of its own either; and a whole may
+        // be as long as the line.
+        place = line.find(word, static_cast<std::size_t>(whole.end() - line.begin()));
     }
     return tools::inquotes(word) + " inside " + tools::inquotes(first);
 }
