@@ -14,6 +14,7 @@ std::string hexdigits(std::string_view bytes)
 {
     constexpr std::string_view kDigits = "0123456789abcdef";
     std::string digits;
+    digits.reserve(2 * bytes.size());
     for (const char byte : bytes) {
         const auto value = static_cast<unsigned char>(byte);
         digits += kDigits[value >> 4U];

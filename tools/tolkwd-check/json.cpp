@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <iomanip>
 
 #include <nlohmann/json.hpp>
 
@@ -72,9 +73,9 @@ ordered_json resultjson(const std::string& name, const sourcetext& source, const
             {"targets", targets}};
 }
 
-std::string resulttext(const std::string& name, const sourcetext& source, const daemonview& view,
-                       const std::vector<finding>& found, const std::vector<targetplan>* plan,
-                       const std::vector<targetprobe>* probes)
+void writeresult(std::ostream& out, const std::string& name, const sourcetext& source,
+                 const daemonview& view, const std::vector<finding>& found,
+                 const std::vector<targetplan>* plan, const std::vector<targetprobe>* probes)
 {
     auto result = resultjson(name, source, view, found);
     if (plan != nullptr) {
@@ -83,7 +84,7 @@ std::string resulttext(const std::string& name, const sourcetext& source, const 
     if (probes != nullptr) {
         result["probe"] = probejson(*probes);
     }
-    return result.dump(2);
+    out << std::setw(2) << result << '\n';
 }
 
 } // namespace check

@@ -1,6 +1,7 @@
 // The results for other programs. The form is documented in tolkwd-check(8).
 #pragma once
 
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -21,9 +22,9 @@ inline constexpr int kFormatVersion = 1;
 nlohmann::ordered_json resultjson(const std::string& name, const sourcetext& source,
                                   const daemonview& view, const std::vector<finding>& found);
 
-// The same as text, with the plan and the probe unless they are null. One thread.
-std::string resulttext(const std::string& name, const sourcetext& source, const daemonview& view,
-                       const std::vector<finding>& found, const std::vector<targetplan>* plan,
-                       const std::vector<targetprobe>* probes);
+// Writes the same, with the plan and the probe unless they are null. One thread.
+void writeresult(std::ostream& out, const std::string& name, const sourcetext& source,
+                 const daemonview& view, const std::vector<finding>& found,
+                 const std::vector<targetplan>* plan, const std::vector<targetprobe>* probes);
 
 } // namespace check

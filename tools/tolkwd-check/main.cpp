@@ -153,9 +153,8 @@ void writejson(const options& chosen, const sourcetext& source, const daemonview
                const std::vector<finding>& found, const std::vector<targetplan>& plan,
                const std::vector<targetprobe>& probes)
 {
-    std::cout << resulttext(chosen.file, source, view, found, chosen.plan ? &plan : nullptr,
-                            chosen.probe ? &probes : nullptr)
-              << '\n';
+    writeresult(std::cout, chosen.file, source, view, found, chosen.plan ? &plan : nullptr,
+                chosen.probe ? &probes : nullptr);
 }
 
 int unreadable(const options& chosen, const std::string& reason)

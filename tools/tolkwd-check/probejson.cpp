@@ -72,13 +72,12 @@ ordered_json probejson(const std::vector<targetprobe>& probes)
 {
     ordered_json list = ordered_json::array();
     for (const targetprobe& probe : probes) {
-        const ordered_json check = probe.check
-                                       ? commandjson(*probe.check, checkword(probe.check->result))
-                                       : ordered_json();
-        list.push_back({{"name", tools::textjson(probe.name)},
-                        {"status", commandjson(probe.status, statusword(probe.status.result))},
-                        {"check", check},
-                        {"process", processjson(probe.process)}});
+        list.push_back(
+            {{"name", tools::textjson(probe.name)},
+             {"status", commandjson(probe.status, statusword(probe.status.result))},
+             {"check", probe.check ? commandjson(*probe.check, checkword(probe.check->result))
+                                   : ordered_json()},
+             {"process", processjson(probe.process)}});
     }
     return list;
 }
