@@ -45,6 +45,8 @@ TEST(Programs, StandBehindAssignmentsAndStarters)
                 ElementsAre("timeout", "a"));
     EXPECT_THAT(programsin("exec nice -n 5 env -i -u X A=1 nohup sudo -u web -n a"),
                 ElementsAre("nice", "env", "nohup", "sudo", "a"));
+    EXPECT_THAT(programsin("prlimit --fsize=65536 a; timeout 5 prlimit -p 1 --nofile"),
+                ElementsAre("prlimit", "a", "timeout", "prlimit"));
     EXPECT_THAT(programsin("timeout -k"), ElementsAre("timeout"));
 }
 

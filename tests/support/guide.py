@@ -11,13 +11,22 @@ GUIDE = pathlib.Path(__file__).resolve().parents[2] / "doc" / "OPERATING.md"
 LEFT_OUT = "..."
 
 
+def _section(title):
+    return GUIDE.read_text(encoding="utf-8").split(f"## {title}\n")[1].split("\n## ")[0]
+
+
+def commands(title, word):
+    """The indented lines of the section that hold the word."""
+    return [line[4:] for line in _section(title).splitlines()
+            if line.startswith("    ") and word in line]
+
+
 def _blocks(title, program):
     """The indented blocks of the section that are of this program, each as its lines. An output's
     empty line is kept."""
-    section = GUIDE.read_text(encoding="utf-8").split(f"## {title}\n")[1].split("\n## ")[0]
     found = []
     inside = False  # such a block
-    for paragraph in section.split("\n\n"):
+    for paragraph in _section(title).split("\n\n"):
         lines = paragraph.strip("\n").split("\n")
         indented = all(line.startswith("    ") for line in lines)
         lines = [line[4:] for line in lines]

@@ -183,6 +183,7 @@ constexpr std::array kStarters = {
     starter{"exec", " -a ", 0},
     starter{"nice", " -n --adjustment ", 0},
     starter{"nohup", " ", 0},
+    starter{"prlimit", " -o -p --output --pid ", 0},
     starter{"setsid", " ", 0},
     starter{"sudo", " -u -g -h -p -C -D -R -T -r -t ", 0},
 };
