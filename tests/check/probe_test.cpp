@@ -15,6 +15,7 @@
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 
+#include "owners.h"
 #include "surroundings.h"
 #include "wdLocalLog_linux.h"
 #include "wdmonitorthread_linux.h"
@@ -358,6 +359,31 @@ TEST_F(Probe, KnowsNoProcessorTimeOfAProcessThatItHasReadOnce)
     EXPECT_EQ(process.pid, sleeper);
     EXPECT_EQ(process.threads.value, 1);
     EXPECT_FALSE(process.processor.value);
+}
+
+// Another user's ones need root: tests/check/rules/probe-users and probe_test.py have some.
+TEST(Starters, AreTheUsersOfProcessesThatNoneOfThemStarted)
+{
+    const pid_t child = fork();
+    ASSERT_GE(child, 0);
+    if (child == 0) {
+        pause();
+        _exit(0);
+    }
+    const std::vector<uid_t> self{getuid()};
+    EXPECT_EQ(startersof({child}), self);
+    EXPECT_EQ(startersof({child, getpid()}), self);
+    EXPECT_EQ(startersof({getpid(), child}), self);
+    kill(child, SIGKILL);
+    waitpid(child, nullptr, 0);
+    EXPECT_TRUE(startersof({child}).empty()) << "it has ended";
+    EXPECT_TRUE(startersof({}).empty());
+}
+
+TEST(Starters, AreToldByName)
+{
+    EXPECT_EQ(username(0), "root");
+    EXPECT_EQ(username(4000000), "user 4000000");
 }
 
 TEST_F(Probe, MissesTheProcessOnlyWhereTheDaemonLooksForIt)

@@ -217,6 +217,26 @@ def test_the_figures_stand_beside_the_thresholds(sandbox):
     assert "ThresholdAverageCPUUsage" in result["findings"][0]["message"]
 
 
+def test_workers_of_another_user_are_their_masters(sandbox):
+    """As of nginx: root starts the master, which gives its workers another user."""
+    sandbox.service("web", "echo web is running")
+    sandbox.configure({"name": "web", "functionalpingcmd": "echo service: ok", "MaxFPSkips": "3",
+                       "binarypath": "/opt/stage/bin/master"})
+    (sandbox.stage / "master.py").write_text(
+        "import os, time\n"
+        "if os.fork() == 0:\n"
+        "    os.setresuid(65534, 65534, 65534)\n"
+        "    print('ready', flush=True)\n"
+        "time.sleep(60)\n")
+    command = sandbox.command(
+        "cp $(readlink -f /usr/bin/python3) /opt/stage/bin/master\n"
+        "exec 3< <(exec /opt/stage/bin/master /opt/stage/master.py)\nread -u 3 ready\n"
+        f"pidof /opt/stage/bin/master | wc -w\ntolkwd-check {PROBE}")
+    played = subprocess.run(command, capture_output=True, timeout=LIMIT_SECONDS)
+    assert played.stdout.startswith(b"2\nweb\n")
+    assert played.returncode == 0
+
+
 def test_the_load_is_reckoned_with_what_was_measured(sandbox):
     sandbox.service("web", "sleep 1.5; echo web is running")
     sandbox.configure({"name": "web", "genpinginterval": "1"})

@@ -2,11 +2,14 @@
 
 #include <algorithm>
 #include <chrono>
+#include <iterator>
+#include <sstream>
 #include <thread>
 #include <utility>
 
 #include "ProcessStatistics_Linux.h"
 #include "fields.h"
+#include "owners.h"
 #include "printable.h"
 #include "reason.h"
 #include "surroundings.h"
@@ -86,6 +89,12 @@ commandprobe trycheck(const service& svc)
     return tried;
 }
 
+std::vector<int> numbersin(const std::string& text)
+{
+    std::istringstream stream(text);
+    return {std::istream_iterator<int>(stream), {}};
+}
+
 // The figures of a target's process, taken twice, for the processor's is one over time.
 class processreading {
 public:
@@ -100,7 +109,9 @@ public:
     // Whether there is a process to read from.
     bool read()
     {
-        before = std::exchange(pid, Utility::str2int(Utility::pidof(path)));
+        const std::string printed = Utility::pidof(path);
+        before = std::exchange(pid, Utility::str2int(printed));
+        users = startersof(numbersin(printed));
         if (pid == 0) {
             return false;
         }
@@ -113,6 +124,7 @@ public:
     {
         processprobe process;
         process.pid = known ? pid : 0;
+        process.users = users;
         process.threads.threshold = statistics.GetThresholdThreadCount();
         process.memory.threshold = statistics.GetThresholdMemoryUsage();
         process.processor.threshold = statistics.GetThresholdAverageCPUUsage();
@@ -131,6 +143,7 @@ private:
     ProcessStatistics statistics;
     int pid = 0;
     int before = 0;
+    std::vector<uid_t> users;
     bool known = false;
 };
 
@@ -276,12 +289,39 @@ std::string allabove(const processprobe& process)
     return words;
 }
 
+// Such as: root, www and 3 more
+std::string userwords(const std::vector<uid_t>& users)
+{
+    constexpr std::size_t kShown = 3;
+    std::string words;
+    for (std::size_t i = 0; i < std::min(users.size(), kShown); ++i) {
+        words += (i > 0 ? ", " : "") + username(users[i]);
+    }
+    return users.size() > kShown ? words + " and " + std::to_string(users.size() - kShown) + " more"
+                                 : words;
+}
+
+void findusers(const targetview& target, const targetprobe& probe, findings& found)
+{
+    if (probe.process.users.size() > 1) {
+        found.add("probe-users", severity::warning, placeof(target, &service::binarypath),
+                  "several users run processes of " + tools::inquotes(probe.binarypath) + " (" +
+                      userwords(probe.process.users) +
+                      "): the daemon compares the first one that pidof prints with the "
+                      "thresholds, whoever started it, so each of these users can make " +
+                      tools::inquotes(probe.name) +
+                      " count as busy and have its check left out; write 0 for MaxFPSkips unless "
+                      "you trust them all");
+    }
+}
+
 void findprocess(const targetview& target, const targetprobe& probe, findings& found)
 {
     const processprobe& process = probe.process;
     if (!process.counts) {
         return;
     }
+    findusers(target, probe, found);
     const std::string name = tools::inquotes(probe.name);
     if (process.pid == 0 && probe.status.result == kServiceRunning) {
         found.add("probe-process", severity::warning, placeof(target, &service::binarypath),

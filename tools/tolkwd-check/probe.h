@@ -8,6 +8,8 @@
 #include <string_view>
 #include <vector>
 
+#include <sys/types.h>
+
 #include <nlohmann/json_fwd.hpp>
 
 #include "daemonview.h"
@@ -36,11 +38,12 @@ struct figureprobe {
 };
 
 struct processprobe {
-    int pid = 0;           // 0: pidof found none
-    bool counts = false;   // whether the daemon looks at the figures at all
-    figureprobe threads;   //
-    figureprobe memory;    // resident pages
-    figureprobe processor; // user ticks per second, times 1000
+    int pid = 0;                // 0: pidof found none
+    std::vector<uid_t> users{}; // who started the processes that it found
+    bool counts = false;        // whether the daemon looks at the figures at all
+    figureprobe threads;        //
+    figureprobe memory;         // resident pages
+    figureprobe processor;      // user ticks per second, times 1000
 
     [[nodiscard]] bool busy() const noexcept
     {

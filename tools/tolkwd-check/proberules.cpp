@@ -6,7 +6,7 @@ namespace check {
 
 namespace {
 
-constexpr std::array<rule, 4> kRules{{
+constexpr std::array<rule, 5> kRules{{
     {"probe-busy", "a figure of the process is above its threshold now",
      "With --probe. A service whose process is above one of its thresholds counts as busy, and the "
      "daemon leaves its check out, as often in a row as MaxFPSkips says. There is no value for "
@@ -39,6 +39,14 @@ constexpr std::array<rule, 4> kRules{{
      "the daemon watches it no more until its next refresh. Correct the name, or start the "
      "service.",
      "<name>ngnix</name>", "<name>nginx</name>"},
+    {"probe-users", "processes of several users count as the service's",
+     "With --probe. pidof finds the processes of a program whoever started them, and the daemon "
+     "compares the first one with the thresholds. A user who runs the program with many threads "
+     "makes the service count as busy: its check is left out as often in a row as MaxFPSkips says, "
+     "and a check that is left out counts as a success. Write 0 for MaxFPSkips where users are not "
+     "trusted. A process that another one of them started, as a master starts its workers, is no "
+     "reason for this warning.",
+     "<MaxFPSkips>5</MaxFPSkips>", "<MaxFPSkips>0</MaxFPSkips>"},
 }};
 
 } // namespace

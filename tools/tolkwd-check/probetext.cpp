@@ -3,10 +3,10 @@
 #include <array>
 #include <cstdio>
 
-#include <pwd.h>
 #include <unistd.h>
 
 #include "fields.h"
+#include "owners.h"
 #include "printable.h"
 #include "terminal.h"
 #include "units.h"
@@ -155,13 +155,6 @@ void writeprocess(std::ostream& out, const targetprobe& probe)
         << kIndent << busywords(probe) << '\n';
 }
 
-std::string username()
-{
-    const uid_t user = geteuid();
-    const passwd* const entry = getpwuid(user);
-    return entry != nullptr ? tools::printable(entry->pw_name) : "user " + std::to_string(user);
-}
-
 } // namespace
 
 std::optional<std::string> probequestion(const daemonview& view)
@@ -181,7 +174,7 @@ std::optional<std::string> probequestion(const daemonview& view)
     }
     const auto targets = static_cast<long long>(view.targets.size());
     return (checks > 0 ? "The checks:\n" : "") + commands + "This runs " +
-           counted(targets + checks, "command", "commands") + " as " + username() + " (" +
+           counted(targets + checks, "command", "commands") + " as " + username(geteuid()) + " (" +
            counted(targets, "status command", "status commands") + ", " +
            counted(checks, "check", "checks") + "), and pidof for " +
            counted(targets, "program", "programs") +
