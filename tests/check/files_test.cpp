@@ -3,6 +3,7 @@
 #include <filesystem>
 #include <fstream>
 #include <string>
+#include <vector>
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
@@ -45,19 +46,94 @@ TEST_F(Files, TellWhatIsThere)
     EXPECT_TRUE(files.of(make("program", 0700)).executable);
 }
 
-TEST_F(Files, TellWhoMayWrite)
-{
-    const bool root = geteuid() == 0; // what another one has is open to that one
-    EXPECT_EQ(files.of(make("own", 0600)).exposed, !root);
-    EXPECT_TRUE(files.of(make("all", 0602)).exposed);
-    const std::string group = make("group", 0620);
-    if (root) {
-        ASSERT_EQ(chown(group.c_str(), 0, 65534), 0);
-        ASSERT_EQ(chmod(group.c_str(), 0620), 0);
-        EXPECT_FALSE(files.of(make("rootsgroup", 0620)).exposed);
+// On the way to a file; only root can make files of others, and has a way of root's folders.
+class Ways : public Files {
+protected:
+    void SetUp() override
+    {
+        if (geteuid() != 0) {
+            GTEST_SKIP() << "needs root";
+        }
     }
-    EXPECT_TRUE(files.of(group).exposed);
-    EXPECT_TRUE(files.of("/tmp").exposed) << "sticky or not";
+
+    // A folder of these rights, and of this owner and group.
+    std::string makefolder(const std::string& name, mode_t mode, uid_t owner = 0, gid_t group = 0)
+    {
+        std::string path = folder + "/" + name;
+        std::filesystem::create_directories(path);
+        EXPECT_EQ(chown(path.c_str(), owner, group), 0);
+        EXPECT_EQ(chmod(path.c_str(), mode), 0);
+        return path;
+    }
+
+    // A link of this owner.
+    std::string makelink(const std::string& name, const std::string& to, uid_t owner = 0)
+    {
+        std::string path = folder + "/" + name;
+        std::filesystem::create_symlink(to, path);
+        EXPECT_EQ(lchown(path.c_str(), owner, owner), 0);
+        return path;
+    }
+
+    static constexpr uid_t kOther = 65534;
+};
+
+using paths = std::vector<std::string>;
+
+TEST_F(Ways, ToAFileEndAtTheFile)
+{
+    EXPECT_EQ(files.writableon(make("own", 0600)), paths{});
+    EXPECT_EQ(files.writableon(make("all", 0602)), paths{folder + "/all"});
+    const std::string group = make("group", 0620);
+    EXPECT_EQ(files.writableon(group), paths{}) << "root's group";
+    ASSERT_EQ(chown(make("others", 0600).c_str(), kOther, 0), 0);
+    EXPECT_EQ(files.writableon(folder + "/others"), paths{folder + "/others"});
+    EXPECT_EQ(files.writableon(folder + "/none"), paths{});
+}
+
+TEST_F(Ways, BeginAtTheRoot)
+{
+    const std::string top = makefolder("top", 0755, kOther);
+    const std::string middle = makefolder("top/middle", 0775, 0, kOther);
+    makefolder("top/middle/low", 0755);
+    const std::string file = make("top/middle/low/program", 0755);
+    EXPECT_EQ(files.writableon(file), (paths{top, middle}));
+    EXPECT_EQ(files.writableon(folder + "/top/./middle//../none"), (paths{top, middle, top}));
+}
+
+TEST_F(Ways, PassAStickyFolderWhereTheyGoOnToRootsFiles)
+{
+    const std::string shared = makefolder("shared", 01777);
+    EXPECT_EQ(files.writableon(make("shared/roots", 0755)), paths{});
+    ASSERT_EQ(chown(make("shared/others", 0755).c_str(), kOther, 0), 0);
+    EXPECT_EQ(files.writableon(shared + "/others"), paths{shared + "/others"});
+    EXPECT_EQ(files.writableon(shared), paths{shared}) << "anybody can add to it";
+    EXPECT_EQ(files.writableon(makefolder("others", 01777, kOther) + "/none"),
+              paths{folder + "/others"})
+        << "its owner can replace what is in it";
+}
+
+TEST_F(Ways, FollowLinks)
+{
+    makefolder("open", 0777);
+    make("open/program", 0755);
+    const paths open{folder + "/open"};
+    EXPECT_EQ(files.writableon(makelink("near", "open/program")), open);
+    EXPECT_EQ(files.writableon(makelink("far", folder + "/open/program")), open);
+    EXPECT_EQ(files.writableon(makelink("folder", "open") + "/program"), open);
+    EXPECT_EQ(files.writableon(makelink("open/back", "../own", kOther)), open);
+    EXPECT_EQ(files.writableon(makelink("ring", "ring")), paths{});
+}
+
+// Whoever owns a link cannot have it lead elsewhere but by putting another in its place.
+TEST_F(Ways, PassAnothersLinkWhereHeCannotReplaceIt)
+{
+    make("program", 0755);
+    EXPECT_EQ(files.writableon(makelink("others", "program", kOther)), paths{});
+    makefolder("shared", 01777);
+    EXPECT_EQ(files.writableon(makelink("shared/roots", "../program")), paths{});
+    EXPECT_EQ(files.writableon(makelink("shared/others", "../program", kOther)),
+              paths{folder + "/shared/others"});
 }
 
 TEST_F(Files, FollowLinks)

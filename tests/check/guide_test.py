@@ -65,3 +65,33 @@ def test_a_bounded_check_answers(tmp_path, command):
 def test_an_answer_before_the_bound_is_kept(tmp_path):
     _, line = checked(tmp_path, BOUNDS[1], "#!/bin/sh\necho service: ok\nexec yes\n")
     assert line == "service: ok"
+
+
+PERMISSIONS = guide.script("12. Permissions", "find ")
+
+# All that the script looks at, root's.
+SOUND = """
+mkdir -p /etc/opt/varden/tolk /opt/varden/tolk/bin /opt/site/team/bin /opt/links
+touch /etc/opt/varden/tolk/tolkwd.xml /opt/varden/tolk/bin/agent.web /opt/site/team/bin/check
+ln -s /opt/site/team/bin/check /opt/links/check
+"""
+
+
+@pytest.mark.parametrize("spoilt, printed", [
+    (":", []),
+    ("chmod 664 /etc/opt/varden/tolk/tolkwd.xml", ["/etc/opt/varden/tolk/tolkwd.xml"]),
+    ("chown 65534 /opt/varden", ["/opt/varden"]),
+    ("chmod 1777 /opt/varden/tolk/bin", ["/opt/varden/tolk/bin"]),
+    ("chown 65534 /opt/site", ["/opt/site"]),
+    ("chmod 757 /opt/site/team", ["/opt/site/team"]),
+    ("chown 65534 /opt/links", ["/opt/links"]),
+    ("chown 65534 /opt/site /etc/opt", ["/etc/opt", "/opt/site"]),
+])
+def test_the_permission_test_looks_up_to_the_root(spoilt, printed):
+    assert "/usr/local/sbin/check-smtp" in PERMISSIONS
+    script = PERMISSIONS.replace("/usr/local/sbin/check-smtp", "/opt/links/check")
+    assert play(f"{SOUND}\n{spoilt}\n{script}").splitlines() == printed
+
+
+def test_the_permission_test_ends_where_a_file_is_missing():
+    assert play(SOUND + PERMISSIONS.replace("/usr/local/sbin/", "no/such/") + "true") == ""

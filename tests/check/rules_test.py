@@ -93,6 +93,19 @@ def test_right_file_is_silent(program, name):
     assert play(program, FOLDERS[name], "right") == "exit status 0\n"
 
 
+def test_a_draft_of_ones_own_is_worth_a_note(program):
+    """In folders of one's own, about which nothing is said."""
+    script = ("sh /run/rule/prepare.sh right; mkdir -p /opt/home/drafts /opt/varden/tolk/bin;"
+              "cp /run/rule/right.xml /opt/home/drafts; chown -R 65534 /opt/home;"
+              "exec setpriv --reuid=65534 --clear-groups"
+              " /run/program/tolkwd-check /opt/home/drafts/right.xml")
+    result = sandboxed(program, FOLDERS["writable-file"], "sh", "-c", script)
+    line, = result.stdout.splitlines()
+    assert line.startswith('/opt/home/drafts/right.xml:1:1: note: "/opt/home/drafts/right.xml", ')
+    assert line.endswith(" [writable-file]")
+    assert said(result).endswith("exit status 0\n")
+
+
 @pytest.mark.parametrize("example, arguments", [
     ("config/tolkwd.xml", []),
     ("config/nginx-php-fpm.xml", []),

@@ -21,6 +21,13 @@ def commands(title, word):
             if line.startswith("    ") and word in line]
 
 
+def script(title, word):
+    """The script of the section that holds the word."""
+    found, = [block for block in re.findall(r"^```sh\n(.*?)^```$", _section(title), re.M | re.S)
+              if word in block]
+    return found
+
+
 def _blocks(title, program):
     """The indented blocks of the section that are of this program, each as its lines. An output's
     empty line is kept."""

@@ -1,9 +1,12 @@
 #include "files.h"
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstdlib>
+#include <filesystem>
 #include <memory>
+#include <system_error>
 
 #include <dirent.h>
 #include <fcntl.h>
@@ -45,14 +48,72 @@ filefacts look(const std::string& path)
         none.found = ismissing(errno) ? presence::kMissing : presence::kHidden;
         return none;
     }
-    const bool bygroup = (seen.st_mode & S_IWGRP) != 0 && seen.st_gid != 0;
     return {
         .found = presence::kThere,
         .folder = S_ISDIR(seen.st_mode),
         .executable = S_ISREG(seen.st_mode) && (seen.st_mode & (S_IXUSR | S_IXGRP | S_IXOTH)) != 0,
-        .exposed = seen.st_uid != 0 || bygroup || (seen.st_mode & S_IWOTH) != 0,
         .owner = seen.st_uid,
     };
+}
+
+bool iswritable(const struct stat& seen)
+{
+    const bool bygroup = (seen.st_mode & S_IWGRP) != 0 && seen.st_gid != 0;
+    return seen.st_uid != 0 || bygroup || (seen.st_mode & S_IWOTH) != 0;
+}
+
+// Whether others may add to the folder, but not replace what is root's there.
+bool issticky(const struct stat& seen)
+{
+    return S_ISDIR(seen.st_mode) && (seen.st_mode & S_ISVTX) != 0 && seen.st_uid == 0;
+}
+
+// The components of `path`, the last one first.
+std::vector<std::string> components(const std::filesystem::path& path)
+{
+    std::vector<std::string> parts;
+    for (const std::filesystem::path& part : path) {
+        if (!part.empty() && part != ".") {
+            parts.push_back(part);
+        }
+    }
+    std::reverse(parts.begin(), parts.end());
+    return parts;
+}
+
+std::vector<std::string> findwritable(const std::string& path)
+{
+    constexpr int kMostLinks = 40; // the kernel follows no more either
+    std::error_code failure;
+    std::vector<std::string> found;
+    std::vector<std::string> left = components(std::filesystem::absolute(path, failure));
+    std::filesystem::path here; // without links
+    struct stat folder {};      // of `here`
+    for (int links = 0; !left.empty() && links <= kMostLinks;) {
+        const std::string part = left.back();
+        left.pop_back();
+        const std::filesystem::path next = part == ".." ? here.parent_path() : here / part;
+        struct stat seen {};
+        if (lstat(next.c_str(), &seen) != 0) {
+            break;
+        }
+        if (S_ISLNK(seen.st_mode)) {
+            // Who owns a link cannot change it, but replace it where the folder lets him.
+            if (seen.st_uid != 0 && issticky(folder) && iswritable(folder)) {
+                found.push_back(next);
+            }
+            const auto behind = components(std::filesystem::read_symlink(next, failure));
+            left.insert(left.end(), behind.begin(), behind.end());
+            ++links;
+            continue;
+        }
+        here = next;
+        folder = seen;
+        if (iswritable(seen) && (!issticky(seen) || left.empty())) {
+            found.push_back(here);
+        }
+    }
+    return found;
 }
 
 bool beginsasscript(const std::string& path)
@@ -113,6 +174,11 @@ const std::string& machinefiles::realpathof(const std::string& path)
         const std::unique_ptr<char, textfree> real(realpath(asked.c_str(), nullptr));
         return real ? std::string(real.get()) : asked;
     });
+}
+
+const std::vector<std::string>& machinefiles::writableon(const std::string& path)
+{
+    return remembered(writables, path, findwritable);
 }
 
 bool machinefiles::isservice(const std::string& name)

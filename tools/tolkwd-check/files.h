@@ -7,6 +7,7 @@
 #include <string>
 #include <string_view>
 #include <unordered_map>
+#include <vector>
 
 namespace check {
 
@@ -21,7 +22,6 @@ struct filefacts {
     presence found = presence::kMissing; // symbolic links followed
     bool folder = false;
     bool executable = false; // a file that root can execute
-    bool exposed = false;    // others than root may write it; a sticky folder's they may add to
     unsigned owner = 0;      // user id
 };
 
@@ -41,6 +41,11 @@ public:
     // Its path without symbolic links, or `path` where that cannot be told.
     const std::string& realpathof(const std::string& path);
 
+    // What others than root may write of all that lies on the way from "/" to `path`, itself
+    // included: folders, files, links and what these lead to. A folder with the sticky bit is none
+    // of it unless it is the end of the way: others may add to it, but not replace what is root's.
+    const std::vector<std::string>& writableon(const std::string& path);
+
     // Whether the service command may know the name: an init script or a systemd unit is there, or
     // a folder that may hold one cannot be read.
     bool isservice(const std::string& name);
@@ -53,6 +58,7 @@ private:
     std::unordered_map<std::string, std::string> programs;
     std::unordered_map<std::string, bool> scripts;
     std::unordered_map<std::string, std::string> realpaths;
+    std::unordered_map<std::string, std::vector<std::string>> writables;
     std::set<std::string, std::less<>> services; // init scripts by name, units without ".service"
     bool listed = false;
     bool hidden = false;

@@ -74,24 +74,36 @@ private:
         if (path == "-") {
             return;
         }
+        const std::string what = "the configuration";
         const unsigned self = geteuid();
-        const bool draft = self != 0 && files.of(path).owner == self;
-        const severity level = draft ? severity::note : severity::error;
-        exposed(path, kNoPlace, "the configuration", level);
-        exposed(folderof(files.realpathof(path)), kNoPlace, "the configuration's folder", level);
+        if (self != 0 && files.of(path).owner == self) {
+            addwritable(files.realpathof(path), kNoPlace, what, severity::note);
+        } else {
+            exposed(path, kNoPlace, what);
+        }
     }
 
-    void exposed(const std::string& which, std::size_t place, std::string_view what,
-                 severity level = severity::error)
+    // The file or folder itself, and all that lies on the way to it.
+    void exposed(const std::string& which, std::size_t place, const std::string& what)
     {
-        const std::string& real = files.realpathof(which);
-        if (files.of(real).exposed && told.insert(real).second) {
-            found.add(
-                "writable-file", level, place,
-                tools::inquotes(real) + ", " + std::string(what) +
-                    ", can be written by others than root, who so can have the daemon run anything "
-                    "as root; make root its owner and the only one who may write it");
+        for (const std::string& each : files.writableon(which)) {
+            if (told.insert(each).second) {
+                const bool itself = each == files.realpathof(which);
+                addwritable(each, place,
+                            itself ? what
+                                   : "on the path of " + tools::inquotes(which) + ", " + what,
+                            severity::error);
+            }
         }
+    }
+
+    void addwritable(const std::string& which, std::size_t place, const std::string& what,
+                     severity level)
+    {
+        found.add("writable-file", level, place,
+                  tools::inquotes(which) + ", " + what +
+                      ", can be written by others than root, who so can have the daemon run "
+                      "anything as root; make root its owner and the only one who may write it");
     }
 
     void checkprogram(const serviceview& view)
@@ -188,8 +200,6 @@ private:
             return;
         }
         exposed(file, placeof(view, which), "which " + fieldof(view, which) + " runs");
-        exposed(folderof(files.realpathof(file)), placeof(view, which),
-                "the folder of a program that " + fieldof(view, which) + " runs");
     }
 
     void missing(const serviceview& view, field which, const program& named)

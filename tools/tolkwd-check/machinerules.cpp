@@ -45,10 +45,12 @@ constexpr std::array<rule, 7> kRules{{
      "vain and given up. A dependent service with commands of its own needs no such thing.",
      "<name>ngnix</name>", "<name>nginx</name>"},
     {"writable-file", "others than root can write what the daemon reads or runs as root",
-     "Whoever can write the configuration, a program or script that it names, the folder "
-     "of what pings print, or the folder of one of them, can have root run what he likes. "
-     "A folder with the sticky bit counts, too. Who is not root and checks a file of his "
-     "own gets a note only, for it is mostly a draft.",
+     "Whoever can write the configuration, a program or script that it names, the folder of what "
+     "pings print, or any folder above one of them, up to /, can have root run what he likes. "
+     "Symbolic links are followed, and so are the folders above them. A folder with the sticky "
+     "bit, such as /tmp, does not count where what the path goes on to is root's, for others can "
+     "add to it, but not replace that; as the folder of what pings print it counts. Who is not "
+     "root and checks a file of his own gets a note only, for it is mostly a draft.",
      "chmod 666 /etc/opt/varden/tolk/tolkwd.xml", "chmod 644 /etc/opt/varden/tolk/tolkwd.xml"},
 }};
 
