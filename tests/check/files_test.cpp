@@ -136,6 +136,24 @@ TEST_F(Ways, PassAnothersLinkWhereHeCannotReplaceIt)
               paths{folder + "/shared/others"});
 }
 
+TEST_F(Ways, TellWhetherOthersMayRead)
+{
+    makefolder(".", 0755);
+    EXPECT_TRUE(files.isreadable(make("all", 0604)));
+    EXPECT_FALSE(files.isreadable(make("own", 0600)));
+    EXPECT_FALSE(files.isreadable(make("rootsgroup", 0640)));
+    const std::string group = make("group", 0640);
+    ASSERT_EQ(chown(group.c_str(), 0, kOther), 0);
+    EXPECT_TRUE(files.isreadable(group));
+    makefolder("closed/open", 0755);
+    makefolder("closed", 0700);
+    EXPECT_FALSE(files.isreadable(make("closed/open/all", 0644)));
+    EXPECT_FALSE(files.isreadable(makelink("link", "closed/open/all")));
+    makefolder("unlisted", 0711);
+    EXPECT_TRUE(files.isreadable(make("unlisted/all", 0644)));
+    EXPECT_FALSE(files.isreadable(folder + "/none"));
+}
+
 TEST_F(Files, FollowLinks)
 {
     const std::string program = make("program", 0755);

@@ -48,10 +48,13 @@ filefacts look(const std::string& path)
         none.found = ismissing(errno) ? presence::kMissing : presence::kHidden;
         return none;
     }
+    const bool folder = S_ISDIR(seen.st_mode);
+    const mode_t bygroup = seen.st_gid == 0 ? 0 : folder ? S_IXGRP : S_IRGRP;
     return {
         .found = presence::kThere,
-        .folder = S_ISDIR(seen.st_mode),
+        .folder = folder,
         .executable = S_ISREG(seen.st_mode) && (seen.st_mode & (S_IXUSR | S_IXGRP | S_IXOTH)) != 0,
+        .readable = (seen.st_mode & (bygroup | (folder ? S_IXOTH : S_IROTH))) != 0,
         .owner = seen.st_uid,
     };
 }
@@ -179,6 +182,18 @@ const std::string& machinefiles::realpathof(const std::string& path)
 const std::vector<std::string>& machinefiles::writableon(const std::string& path)
 {
     return remembered(writables, path, findwritable);
+}
+
+bool machinefiles::isreadable(const std::string& path)
+{
+    std::string step = realpathof(path);
+    while (of(step).readable) {
+        if (step == "/") {
+            return true;
+        }
+        step = folderof(step);
+    }
+    return false;
 }
 
 bool machinefiles::isservice(const std::string& name)

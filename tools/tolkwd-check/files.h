@@ -22,6 +22,7 @@ struct filefacts {
     presence found = presence::kMissing; // symbolic links followed
     bool folder = false;
     bool executable = false; // a file that root can execute
+    bool readable = false;   // by others than root; of a folder: they may reach what is in it
     unsigned owner = 0;      // user id
 };
 
@@ -45,6 +46,9 @@ public:
     // included: folders, files, links and what these lead to. A folder with the sticky bit is none
     // of it unless it is the end of the way: others may add to it, but not replace what is root's.
     const std::vector<std::string>& writableon(const std::string& path);
+
+    // Whether others than root and its owner may read the file, through the folders above it.
+    bool isreadable(const std::string& path);
 
     // Whether the service command may know the name: an init script or a systemd unit is there, or
     // a folder that may hold one cannot be read.

@@ -10,6 +10,7 @@
 
 #include "fields.h"
 #include "files.h"
+#include "passwords.h"
 #include "printable.h"
 #include "shellwords.h"
 #include "wdmonitorthread_linux.h"
@@ -175,6 +176,7 @@ private:
         if (!isown(view, which) || command == kNoCommand || isnullspelling(command)) {
             return;
         }
+        checkpassword(view, which);
         const auto known = commands.find(command);
         const shelltext& split = known != commands.end()
                                      ? known->second
@@ -185,6 +187,21 @@ private:
         for (const program& each : split.programs) {
             checkcommandfile(view, which, each, split.needed);
         }
+    }
+
+    // It has no place in the file, for the line of the file that is shown would show the password.
+    void checkpassword(const serviceview& view, field which)
+    {
+        const std::string_view form = passwordform(view.record->*which);
+        if (form.empty() || path == "-" || !files.isreadable(path)) {
+            return;
+        }
+        found.add(
+            "password-readable", severity::note, kNoPlace,
+            fieldof(view, which) + " seems to carry a password (" + std::string(form) +
+                "), and others than root can read " + tools::inquotes(path) +
+                ": let only root read it (chmod 600), or have the command read the password from "
+                "a file of root's");
     }
 
     void checkcommandfile(const serviceview& view, field which, const program& named, bool needed)

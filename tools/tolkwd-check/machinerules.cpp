@@ -6,7 +6,7 @@ namespace check {
 
 namespace {
 
-constexpr std::array<rule, 7> kRules{{
+constexpr std::array<rule, 8> kRules{{
     {"binary-blank", "a program's path that the shell takes apart",
      "binarypath stands in the shell command `pidof PATH`: a blank makes two words of it, "
      "and other characters mean something to the shell. A blank in the name of the process "
@@ -33,6 +33,22 @@ constexpr std::array<rule, 7> kRules{{
      "nothing, without a word. What the checker cannot follow it leaves out.",
      "<functionalpingcmd>chekc-web</functionalpingcmd>",
      "<functionalpingcmd>timeout -k 1 10 check-web</functionalpingcmd>"},
+    {"password-readable",
+     "a command that seems to carry a password, in a file that others can read",
+     "Commands stand in the configuration, with -g also in the log and in the journal, and while "
+     "they run in the list of processes. The forms that are looked for: password=VALUE at the end "
+     "of "
+     "any name, and so passwd=, passphrase=, secret=, token=, _PWD= and _AUTH=; --password VALUE "
+     "and "
+     "--pass VALUE; -p of mysql and mariadb, -a of redis-cli, -u of curl; NAME:VALUE@ in a URL. "
+     "What "
+     "the shell puts in, as of $(cat FILE), is no password. The value is not shown, nor its line. "
+     "chmod 600 the configuration, and keep the password in a file of root's.",
+     "<functionalpingcmd>(redis-cli -a tiger ping | grep -q PONG && echo service: ok)"
+     "</functionalpingcmd>",
+     "<functionalpingcmd>(REDISCLI_AUTH=$(cat /root/redis-password) redis-cli ping | grep -q PONG "
+     "&& "
+     "echo service: ok)</functionalpingcmd>"},
     {"ping-folder", "the folder for what pings print is missing",
      "Status commands and checks write into /opt/varden/tolk/bin. Without it the shell "
      "runs none of them: every ping fails, and every service is stopped, started and given "
