@@ -251,6 +251,36 @@ def test_the_load_is_reckoned_with_what_was_measured(sandbox):
     assert b"[lock-starved]" in played.stdout
 
 
+MEBIBYTE = 1 << 20
+
+# Of the program and all that it runs, in kilobytes, on standard error: "peak NUMBER".
+PEAK = """import os, resource, sys
+os.waitpid(os.spawnv(os.P_NOWAIT, sys.argv[1], sys.argv[1:]), 0)
+print("peak", resource.getrusage(resource.RUSAGE_CHILDREN).ru_maxrss, file=sys.stderr)
+"""
+
+
+@pytest.mark.parametrize("option", ["", "--json"])
+@pytest.mark.parametrize("byte", ["x", r"\377"])
+def test_peak_memory_is_bounded_over_an_endless_line(sandbox, option, byte):
+    """And a byte that is not UTF-8, of which JSON holds two digits."""
+    sandbox.service("web", "echo web is running")
+    # A shell runs the check, whose parent is the checker.
+    least = "grep VmHWM /proc/$PPID/status >/opt/stage/least; echo service: ok"
+    line = f"head -c 100000000 /dev/zero | tr '\\0' '{byte}'"
+    sandbox.configure({"name": "web", "functionalpingcmd": f"({least})"},
+                      {"name": "web", "functionalpingcmd": f"({line})"})
+    (sandbox.stage / "peak.py").write_text(PEAK)
+    command = sandbox.command("python3 -I -S /opt/stage/peak.py /opt/program/tolkwd-check "
+                              f"$others --probe --yes {option} /opt/stage/tolkwd.xml")
+    played = subprocess.run(command, capture_output=True, timeout=LIMIT_SECONDS)
+    if option:
+        kept = json.loads(played.stdout)["probe"][1]["check"]["line"]
+        assert kept == ("x" * MEBIBYTE if byte == "x" else {"hex": "ff" * MEBIBYTE})
+    least = int(sandbox.text("least").split()[1])
+    assert int(played.stderr.split()[-1]) - least <= 8 << 10
+
+
 def test_hostile_answers_do_not_reach_the_terminal(sandbox):
     sandbox.service("web", r"printf '\033[2J\r\033]0;x\007 is running\n'")
     sandbox.configure({"name": "web", "functionalpingcmd": r"printf '\033[31m\302\233no\n' >&2"})
