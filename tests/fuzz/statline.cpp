@@ -99,7 +99,7 @@ public:
             lasttime = 0;
         }
         const Texts fields = fieldsof(check);
-        if (fields.empty()) {
+        if (fields.size() < kLeastFields) {
             messages.emplace_back("(p) Unable to fetch stats of process from system");
         } else if (!take(fields, wrapped(check.clock))) {
             messages.emplace_back("Refresh called twice in zero time interval");
@@ -108,11 +108,9 @@ public:
         return messages;
     }
 
-    // None where there are too few.
     static Texts fieldsof(const Check& check)
     {
-        const Texts fields = separated(check.stat.substr(0, check.stat.find(kEndOfStat)), ' ');
-        return fields.size() < kLeastFields ? Texts() : fields;
+        return separated(check.stat.substr(0, check.stat.find(kEndOfStat)), ' ');
     }
 
     [[nodiscard]] std::string statpath() const { return "/proc/" + std::to_string(pid) + "/stat"; }
@@ -206,9 +204,9 @@ void tryfetch(ProcessStatistics& statistics, const Check& check, Stopwatch& watc
         const Stopwatch::Lap lap(watch);
         failure = statistics.FetchStatisticsFromSystem(fields);
     }
-    const Texts expected = Account::fieldsof(check);
-    demand(failure == (expected.empty() ? 1 : 0), "a fetch fails where fields are missing");
-    demand(fields == (expected.empty() ? Texts{"before"} : expected),
+    const bool opens = !check.stat.empty();
+    demand(failure == (opens ? 0 : 1), "a fetch fails where there is no file");
+    demand(fields == (opens ? Account::fieldsof(check) : Texts{"before"}),
            "fields are replaced, unless the fetch fails");
 }
 

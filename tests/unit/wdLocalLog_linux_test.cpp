@@ -637,6 +637,7 @@ TEST_F(LogOfAFreshProcess, IsWaitedForByTheVeryFirstLine)
             close(reader);
             const bool waited =
                 world.events() == lines(std::vector<std::string>(10, "wait 500 ms"));
+            std::filesystem::remove_all(folder.path());
             _exit(waited ? 7 : 8);
         },
         ::testing::ExitedWithCode(7), "");
