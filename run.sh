@@ -8,7 +8,7 @@ usage() {
     cat <<'TEXT'
 usage: run.sh
            Shows the daemon at work in a sandbox: a real service is killed and brought back.
-           Takes a minute, and the time to install what is missing. Leaves the
+           Takes two minutes, and the time to install what is missing. Leaves the
            machine's own services alone.
        run.sh -i FILE -l FILE [-t SECONDS] [-g]
            Runs the daemon for real, in the foreground, as root:

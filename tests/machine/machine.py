@@ -115,5 +115,9 @@ def booted(system, kind):
 if __name__ == "__main__":
     if sys.argv[1:] not in ([kind] for kind in BOOTED):
         sys.exit(__doc__)
-    with booted(systems.base_system(), sys.argv[1]) as found:
+    try:
+        system = systems.base_system()
+    except systems.Impossible as reason:
+        sys.exit(f"no machine can be booted: {reason}")
+    with booted(system, sys.argv[1]) as found:
         found.shell()
