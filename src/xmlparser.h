@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "wdmonitortarget.h"
-#include "xmlscan.h" // whoever reads a configuration also knows `control`
+#include "xmlscan.h" // for its users: `control`
 
 class xmlparser {
 public:

@@ -26,7 +26,7 @@ def play(script, *options):
 
 BOUNDS = guide.commands("5. Bounding commands", "/usr/local/sbin/check-smtp")
 
-# As the unit has a check run. What the shell says of a signal is no part of the answer.
+# Runs a check as the unit does. What the shell says about a signal does not belong to the answer.
 CHECK = """
 printf '%s 1>/tmp/answer 2>/tmp/answer' "$COMMAND" >/tmp/check
 env --ignore-signal=PIPE LC_MESSAGES=C sh /tmp/check 2>/dev/null || true
