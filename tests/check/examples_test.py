@@ -19,6 +19,7 @@ TIME_LIMIT = 60  # seconds
 PLAY = """
 mkdir -p /opt/varden/tolk/bin
 service cron start >/dev/null || exit 99
+until [ "$(pidof cron)" = "$(cat /run/crond.pid)" ]; do sleep 0.05; done
 cp -R --no-preserve=mode,ownership /run/examples /opt/examples && cd /opt/examples || exit 99
 PATH=$PATH:/run/program
 exec "$@"

@@ -2,6 +2,8 @@
 set -eu
 mkdir -p /opt/varden/tolk/bin
 service cron start
+# It becomes another process after it has written the file.
+until [ "$(pidof cron)" = "$(cat /run/crond.pid)" ]; do sleep 0.05; done
 
 # A program that root runs, and another user, too.
 cp /bin/sleep /opt/sleeper
