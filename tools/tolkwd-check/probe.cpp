@@ -24,6 +24,9 @@ using clocktype = std::chrono::steady_clock;
 // The daemon's clock has whole seconds: with fewer between two readings a figure would be coarse.
 constexpr std::chrono::seconds kLeastBetweenReadings{2};
 
+// More than it takes until a process gets a signal that is sent to its whole group.
+constexpr std::chrono::seconds kUntilInterrupted{1};
+
 double secondssince(clocktype::time_point begin)
 {
     return std::chrono::duration<double>(clocktype::now() - begin).count();
@@ -147,6 +150,15 @@ private:
     bool known = false;
 };
 
+// An interrupt from the keyboard ends a command's shell and this process, in either order: after
+// such a command nothing more is run too early.
+void awaitinterrupt(const commandprobe& tried)
+{
+    if (tried.state < 0) {
+        std::this_thread::sleep_for(kUntilInterrupted);
+    }
+}
+
 targetprobe trytarget(const service& svc, progress& shown)
 {
     targetprobe probe{.name = svc.name,
@@ -157,9 +169,11 @@ targetprobe trytarget(const service& svc, progress& shown)
                       .process = {}};
     shown.show("waiting for the status command of " + tools::inquotes(probe.name));
     probe.status = trystatus(svc);
+    awaitinterrupt(probe.status);
     if (ischecked(svc)) {
         shown.show("waiting for the check of " + tools::inquotes(probe.name));
         probe.check = trycheck(svc);
+        awaitinterrupt(*probe.check);
     }
     return probe;
 }
