@@ -315,6 +315,21 @@ def test_an_interrupt_ends_the_probe_and_runs_nothing_more(sandbox, number, whom
     assert sandbox.untouched()
 
 
+def test_an_interrupt_that_the_command_gets_first_runs_nothing_more(sandbox):
+    sandbox.service("web", "sleep 30; echo web is running")
+    sandbox.configure({"name": "web"}, {"name": "mail"})
+    command = sandbox.command(
+        f"set -m; tolkwd-check {PROBE} </dev/null &\n"
+        "until [ -s /opt/stage/calls ]; do sleep 0.05; done\n"
+        "kill -STOP $!; kill -INT -- -$!\n"
+        "for i in 1 2 3 4 5; do grep -q mail /opt/stage/calls && break; sleep 0.1; done\n"
+        "kill -CONT $!; wait $!")
+    played = subprocess.run(command, capture_output=True, timeout=LIMIT_SECONDS,
+                            preexec_fn=lambda: signal.signal(signal.SIGINT, signal.SIG_DFL))
+    assert b"tolkwd-check: interrupted\n" in played.stderr
+    assert sandbox.calls() == ["web status"]
+
+
 def test_an_ignored_signal_stays_ignored(sandbox):
     sandbox.service("web", 'echo called >>/opt/stage/called; sleep 1; echo web is running')
     sandbox.configure({"name": "web"})
