@@ -402,6 +402,29 @@ class Follower:
     def __init__(self, program, folder, *arguments):
         self.process = subprocess.Popen(
             [program, "events", "--follow", *arguments], cwd=folder, stdin=subprocess.DEVNULL,
+def test_a_page_never_replaces_its_log(program, run, tmp_path):
+    log = tmp_path / "evil.log"
+    log.write_text(GIVEN_UP)
+    os.link(log, tmp_path / "hard.log")
+    os.symlink("evil.log", tmp_path / "soft.log")
+    for output in ("evil.log", "./evil.log", "hard.log", "soft.log"):
+        result = run("html", "-o", output, "evil.log")
+        assert (result.returncode, result.stdout) == (70, "")
+        assert result.stderr == f"tolkwd-report: {output}: the output is also an input\n"
+    for redirected in ("html -o evil.log - < evil.log", "html -o - evil.log >> evil.log",
+                       "html -o /dev/stdout - < evil.log >> evil.log"):
+        result = subprocess.run(["sh", "-c", f'"$1" {redirected}', "sh", program], cwd=tmp_path,
+                                stderr=subprocess.PIPE, encoding="utf-8", timeout=LIMIT_SECONDS)
+        assert result.returncode == 70
+        assert result.stderr.endswith(": the output is also an input\n")
+    assert log.read_text() == GIVEN_UP
+
+
+@pytest.mark.parametrize("output", ["/dev/stdout", "/proc/self/fd/1"])
+def test_a_page_goes_to_a_pipe_that_has_no_name(run, output):
+    assert run("html", "-o", output, log=GIVEN_UP).stdout.startswith("<!DOCTYPE html>")
+
+
             stdout=subprocess.PIPE, stderr=subprocess.PIPE, env={**os.environ, **ZONE})
         self.pending = b""
 

@@ -1,19 +1,26 @@
 #include "newfile.h"
 
 #include <array>
+#include <cstdint>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <sstream>
 #include <stdexcept>
 #include <string>
 #include <system_error>
+#include <utility>
+#include <vector>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <fcntl.h>
+#include <grp.h>
+#include <sys/inotify.h>
 #include <sys/stat.h>
+#include <sys/xattr.h>
 #include <unistd.h>
 
 namespace report {
@@ -46,7 +53,70 @@ protected:
         return std::distance(fs::directory_iterator(folder), fs::directory_iterator());
     }
 
+    // A file with a text and a mode.
+    fs::path made(const std::string& name, const std::string& text, mode_t mode = 0644)
+    {
+        const fs::path path = folder / name;
+        std::ofstream(path) << text;
+        EXPECT_EQ(chmod(path.c_str(), mode), 0);
+        return path;
+    }
+
+    static struct stat factsof(const fs::path& path)
+    {
+        struct stat facts {};
+        EXPECT_EQ(stat(path.c_str(), &facts), 0);
+        return facts;
+    }
+
+    static mode_t modeof(const fs::path& path) { return factsof(path).st_mode & 07777U; }
+
+    // What `path` is refused with, which leaves everything as it is; empty if it is not.
+    std::string refusal(const fs::path& path, const std::vector<std::string>& inputs = {}) const
+    {
+        const std::ptrdiff_t before = files();
+        try {
+            writewhole(path, inputs, [](std::ostream& out) { out << "a page"; });
+        } catch (const std::runtime_error& error) {
+            EXPECT_EQ(files(), before);
+            return error.what();
+        }
+        return {};
+    }
+
     fs::path folder;
+};
+
+constexpr uid_t kSomebody = 65534;
+constexpr gid_t kSomeGroup = 65533;
+
+// While it lives, root acts as an ordinary user.
+class somebody {
+public:
+    somebody()
+    {
+        EXPECT_EQ(setgroups(0, nullptr), 0);
+        EXPECT_EQ(setegid(kSomebody), 0);
+        EXPECT_EQ(seteuid(kSomebody), 0);
+    }
+    ~somebody()
+    {
+        EXPECT_EQ(seteuid(0), 0);
+        EXPECT_EQ(setegid(0), 0);
+    }
+    somebody(const somebody&) = delete;
+    somebody& operator=(const somebody&) = delete;
+};
+
+// The rest needs files of several users.
+class NewFileAsRoot : public NewFile {
+protected:
+    void SetUp() override
+    {
+        if (geteuid() != 0) {
+            GTEST_SKIP() << "only root can make files of other users";
+        }
+    }
 };
 
 void writepage(std::ostream& out)
@@ -57,7 +127,7 @@ void writepage(std::ostream& out)
 TEST_F(NewFile, IsMadeWithTheUsualRights)
 {
     umask(022);
-    writewhole(folder / "page", writepage);
+    writewhole(folder / "page", {}, writepage);
     EXPECT_EQ(textof(folder / "page"), "a page");
     struct stat facts {};
     ASSERT_EQ(stat((folder / "page").c_str(), &facts), 0);
@@ -68,7 +138,7 @@ TEST_F(NewFile, IsMadeWithTheUsualRights)
 TEST_F(NewFile, TakesThePlaceOfTheOldOne)
 {
     std::ofstream(folder / "page") << "an old page";
-    writewhole(folder / "page", [&](std::ostream& out) {
+    writewhole(folder / "page", {}, [&](std::ostream& out) {
         writepage(out);
         out.flush();
         EXPECT_EQ(textof(folder / "page"), "an old page");
@@ -80,14 +150,14 @@ TEST_F(NewFile, TakesThePlaceOfTheOldOne)
 TEST_F(NewFile, LeavesTheOldOneWhereItCannotBeWritten)
 {
     std::ofstream(folder / "page") << "an old page";
-    EXPECT_THROW(writewhole(folder / "page",
+    EXPECT_THROW(writewhole(folder / "page", {},
                             [](std::ostream& out) {
                                 writepage(out);
                                 out.setstate(std::ios::badbit);
                             }),
                  std::system_error);
     EXPECT_THROW(
-        writewhole(folder / "page", [](std::ostream&) { throw std::runtime_error("no page"); }),
+        writewhole(folder / "page", {}, [](std::ostream&) { throw std::runtime_error("no page"); }),
         std::runtime_error);
     EXPECT_EQ(textof(folder / "page"), "an old page");
     EXPECT_EQ(files(), 1);
@@ -97,7 +167,7 @@ TEST_F(NewFile, LeavesASymbolicLinkOne)
 {
     std::ofstream(folder / "page") << "an old page";
     fs::create_symlink("page", folder / "link");
-    writewhole(folder / "link", writepage);
+    writewhole(folder / "link", {}, writepage);
     EXPECT_TRUE(fs::is_symlink(folder / "link"));
     EXPECT_EQ(textof(folder / "page"), "a page");
 }
@@ -108,7 +178,7 @@ TEST_F(NewFile, WritesToWhatIsNoPlainFile)
     ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
     const int reader = open(pipe.c_str(), O_RDWR | O_NONBLOCK);
     ASSERT_GE(reader, 0);
-    writewhole(pipe, writepage);
+    writewhole(pipe, {}, writepage);
     std::array<char, 16> text{};
     EXPECT_EQ(read(reader, text.data(), text.size()), 6);
     EXPECT_STREQ(text.data(), "a page");
@@ -120,12 +190,229 @@ TEST_F(NewFile, NamesWhatItCannotWrite)
 {
     const std::string name = folder / "no such folder" / "page";
     try {
-        writewhole(name, writepage);
+        writewhole(name, {}, writepage);
         FAIL() << "it was written";
     } catch (const std::system_error& error) {
         EXPECT_EQ(error.what(), name + ": No such file or directory");
     }
-    EXPECT_THROW(writewhole(folder, writepage), std::system_error);
+    EXPECT_THROW(writewhole(folder, {}, writepage), std::system_error);
+}
+
+TEST_F(NewFile, MakesTheFileThatALinkLeadsTo)
+{
+    fs::create_symlink("page", folder / "link");
+    writewhole(folder / "link", {}, writepage);
+    EXPECT_TRUE(fs::is_symlink(folder / "link"));
+    EXPECT_EQ(textof(folder / "page"), "a page");
+}
+
+TEST_F(NewFile, FollowsLinksThroughFolders)
+{
+    fs::create_directories(folder / "one" / "two");
+    fs::create_directory_symlink(folder / "one", folder / "absolute");
+    fs::create_directory_symlink("../../absolute/./two", folder / "one" / "two" / "relative");
+    writewhole(folder / "absolute" / "two" / "relative" / ".." / "two" / "page", {}, writepage);
+    EXPECT_EQ(textof(folder / "one" / "two" / "page"), "a page");
+}
+
+TEST_F(NewFile, RefusesLinksThatLeadNowhere)
+{
+    fs::create_symlink("other", folder / "one");
+    fs::create_symlink("one", folder / "other");
+    fs::create_symlink("/", folder / "root");
+    const std::string file = made("file", "");
+    EXPECT_EQ(refusal(folder / "one"),
+              (folder / "one").native() + ": Too many levels of symbolic links");
+    EXPECT_EQ(refusal(folder / "root"), (folder / "root").native() + ": Is a directory");
+    EXPECT_EQ(refusal(file + "/page"), file + "/page: Not a directory");
+    EXPECT_EQ(refusal(folder / "new/"), (folder / "new/").native() + ": No such file or directory");
+    EXPECT_EQ(refusal("."), ".: Is a directory");
+    EXPECT_EQ(refusal(""), ": No such file or directory");
+}
+
+TEST_F(NewFile, IsNoneOfTheInputsUnderAnyName)
+{
+    const fs::path log = made("log", "a log");
+    fs::create_hard_link(log, folder / "hard");
+    fs::create_symlink(log, folder / "soft");
+    for (const char* const name : {"log", "hard", "soft", "./log"}) {
+        const fs::path path = folder / name;
+        EXPECT_EQ(refusal(path, {"no such log", folder / "soft"}),
+                  path.native() + ": the output is also an input");
+    }
+    EXPECT_EQ(textof(log), "a log");
+    EXPECT_EQ(refusal(made("page", "an old page"), {log}), "");
+    EXPECT_EQ(textof(folder / "page"), "a page");
+}
+
+TEST_F(NewFile, IsNotTheFileThatIsStandardInput)
+{
+    const fs::path log = made("log", "a log");
+    const int before = dup(STDIN_FILENO);
+    const int fd = open(log.c_str(), O_RDONLY | O_CLOEXEC);
+    ASSERT_GE(dup2(fd, STDIN_FILENO), 0);
+    EXPECT_EQ(refusal(log, {"-"}), log.native() + ": the output is also an input");
+    dup2(before, STDIN_FILENO);
+    close(before);
+    close(fd);
+    EXPECT_EQ(textof(log), "a log");
+}
+
+TEST_F(NewFile, MayBeTheDeviceThatTheLogComesFrom)
+{
+    EXPECT_EQ(refusal("/dev/null", {"/dev/null"}), "");
+}
+
+TEST_F(NewFile, KeepsTheModeOfTheOldOne)
+{
+    umask(022);
+    for (const mode_t mode : {0600U, 0640U, 0664U, 0400U}) {
+        const fs::path page = made("page", "an old page", mode);
+        writewhole(page, {}, writepage);
+        EXPECT_EQ(textof(page), "a page");
+        EXPECT_EQ(modeof(page), mode);
+        fs::remove(page);
+    }
+}
+
+TEST_F(NewFile, DropsTheSetUserBit)
+{
+    const fs::path page = made("page", "an old page", 04755);
+    writewhole(page, {}, writepage);
+    EXPECT_EQ(modeof(page), 0755U);
+}
+
+TEST_F(NewFile, IsReadByItsOwnerOnlyUntilItIsWhole)
+{
+    umask(0);
+    writewhole(folder / "page", {}, [&](std::ostream& out) {
+        writepage(out);
+        ASSERT_EQ(files(), 1);
+        EXPECT_EQ(modeof(fs::directory_iterator(folder)->path()), 0600U);
+    });
+    EXPECT_EQ(modeof(folder / "page"), 0666U);
+}
+
+TEST_F(NewFile, LeavesTheOldContentsToOtherHardLinks)
+{
+    const fs::path page = made("page", "an old page");
+    fs::create_hard_link(page, folder / "hard");
+    writewhole(page, {}, writepage);
+    EXPECT_EQ(textof(folder / "hard"), "an old page");
+    EXPECT_EQ(textof(page), "a page");
+}
+
+// What is opened again by its name may be another file by then.
+TEST_F(NewFile, IsOpenedOnce)
+{
+    const int watch = inotify_init1(IN_NONBLOCK | IN_CLOEXEC);
+    ASSERT_GE(inotify_add_watch(watch, folder.c_str(), IN_OPEN | IN_CLOSE), 0);
+    writewhole(folder / "page", {}, writepage);
+    alignas(inotify_event) std::array<char, 4096> events{};
+    const ssize_t size = read(watch, events.data(), events.size());
+    close(watch);
+    int opened = 0;
+    for (ssize_t place = 0; place < size;) {
+        inotify_event event{};
+        std::memcpy(&event, events.data() + place, sizeof event);
+        opened += (event.mask & IN_OPEN) != 0 ? 1 : 0;
+        place += static_cast<ssize_t>(sizeof event + event.len);
+    }
+    EXPECT_EQ(opened, 1);
+}
+
+// Who may read a file may be said by an access control list: then its mode means something else.
+TEST_F(NewFile, WithoutTheOldAccessControlListGivesNobodyMore)
+{
+    const fs::path page = made("page", "an old page", 0600);
+    struct entry {
+        std::uint16_t tag, rights;
+        std::uint32_t id;
+    };
+    struct {
+        std::uint32_t version = 2;
+        std::array<entry, 5> entries{{{0x01, 6, ~0U}, // owner, a user, group, mask, others
+                                      {0x02, 6, kSomebody},
+                                      {0x04, 0, ~0U},
+                                      {0x10, 6, ~0U},
+                                      {0x20, 0, ~0U}}};
+    } list;
+    if (setxattr(page.c_str(), "system.posix_acl_access", &list, sizeof list, 0) != 0) {
+        GTEST_SKIP() << "no access control lists in " << folder;
+    }
+    ASSERT_EQ(modeof(page), 0660U);
+    writewhole(page, {}, writepage);
+    EXPECT_EQ(modeof(page), 0600U);
+}
+
+TEST_F(NewFileAsRoot, KeepsOwnerAndGroupOfTheOldOne)
+{
+    const fs::path page = made("page", "an old page", 0640);
+    ASSERT_EQ(chown(page.c_str(), kSomebody, kSomeGroup), 0);
+    writewhole(page, {}, writepage);
+    EXPECT_EQ(factsof(page).st_uid, kSomebody);
+    EXPECT_EQ(factsof(page).st_gid, kSomeGroup);
+    EXPECT_EQ(modeof(page), 0640U);
+}
+
+TEST_F(NewFileAsRoot, OfAnotherUserGivesNobodyMore)
+{
+    ASSERT_EQ(chmod(folder.c_str(), 0777), 0);
+    const std::vector<std::pair<mode_t, mode_t>> modes = {{0644, 0644}, {0664, 0644}, {0640, 0600},
+                                                          {0604, 0600}, {0600, 0600}, {0777, 0777}};
+    for (const auto& [before, behind] : modes) {
+        const fs::path page = made("page", "an old page", before);
+        ASSERT_EQ(chown(page.c_str(), 0, kSomeGroup), 0);
+        {
+            const somebody user;
+            writewhole(page, {}, writepage);
+        }
+        EXPECT_EQ(factsof(page).st_uid, kSomebody);
+        EXPECT_EQ(factsof(page).st_gid, kSomebody);
+        EXPECT_EQ(modeof(page), behind) << std::oct << before;
+        fs::remove(page);
+    }
+}
+
+TEST_F(NewFileAsRoot, OfTheSameGroupKeepsItAndTheMode)
+{
+    ASSERT_EQ(chmod(folder.c_str(), 0777), 0);
+    const fs::path page = made("page", "an old page", 0660);
+    ASSERT_EQ(chown(page.c_str(), 0, kSomebody), 0);
+    {
+        const somebody user;
+        writewhole(page, {}, writepage);
+    }
+    EXPECT_EQ(factsof(page).st_gid, kSomebody);
+    EXPECT_EQ(modeof(page), 0660U);
+}
+
+TEST_F(NewFileAsRoot, IsNotWhereALinkOfAnotherUserLeads)
+{
+    fs::create_directory(folder / "real");
+    const fs::path page = made("real/page", "an old page");
+    fs::create_symlink(page, folder / "theirs");
+    fs::create_symlink("theirs", folder / "chain");
+    fs::create_symlink("missing", folder / "dangling");
+    for (const char* const link : {"theirs", "dangling"}) {
+        ASSERT_EQ(lchown((folder / link).c_str(), kSomebody, kSomebody), 0);
+    }
+    for (const char* const name : {"theirs", "chain", "dangling"}) {
+        const fs::path path = folder / name;
+        EXPECT_EQ(refusal(path), path.native() + ": a symbolic link of another user");
+    }
+    EXPECT_EQ(textof(page), "an old page");
+}
+
+TEST_F(NewFileAsRoot, MayBeWhereALinkLeadsForOthers)
+{
+    ASSERT_EQ(chmod(folder.c_str(), 0777), 0);
+    fs::create_symlink("page", folder / "link");
+    {
+        const somebody user;
+        writewhole(folder / "link", {}, writepage);
+    }
+    EXPECT_EQ(textof(folder / "page"), "a page");
 }
 
 } // namespace

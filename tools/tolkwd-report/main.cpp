@@ -143,7 +143,7 @@ int runevents(const options& chosen)
 int runhtml(const options& chosen)
 {
     const pagecontents contents = readpage(chosen.logs, chosen.asofnow);
-    writewhole(chosen.page, [&](std::ostream& out) { writepage(out, contents); });
+    writewhole(chosen.page, chosen.logs, [&](std::ostream& out) { writepage(out, contents); });
     return 0;
 }
 

@@ -1,15 +1,23 @@
 #include "newfile.h"
 
+#include <array>
 #include <cerrno>
-#include <cstdio>
-#include <cstdlib>
+#include <climits>
 #include <filesystem>
-#include <fstream>
 #include <iostream>
+#include <random>
+#include <stdexcept>
 #include <system_error>
+#include <utility>
 
+#include <ext/stdio_filebuf.h>
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <sys/xattr.h>
 #include <unistd.h>
+
+#include "descriptor.h"
+#include "sources.h"
 
 namespace report {
 
@@ -22,22 +30,111 @@ namespace fs = std::filesystem;
     throw std::system_error(reason, std::generic_category(), name);
 }
 
-// A stream does not tell why it failed; what the system said last mostly does.
-void writeto(const fs::path& path, const std::string& name,
-             const std::function<void(std::ostream&)>& write)
+struct stat factsof(const descriptor& file, const std::string& name)
+{
+    struct stat facts {};
+    if (fstat(file.number(), &facts) != 0) {
+        fail(errno, name);
+    }
+    return facts;
+}
+
+struct place {
+    descriptor folder;
+    std::string name{}; // within it
+    descriptor file{};  // what is there, if anything; not open for reading or writing
+};
+
+std::string linktext(const place& link, const std::string& name)
+{
+    std::array<char, PATH_MAX> text{};
+    const ssize_t size =
+        readlinkat(link.folder.number(), link.name.c_str(), text.data(), text.size());
+    if (size < 0) {
+        fail(errno, name);
+    }
+    return {text.data(), static_cast<std::size_t>(size)};
+}
+
+// What is at `path`, which may be relative to the folder `from`.
+place placeof(const fs::path& path, int from, const std::string& name)
+{
+    const fs::path folder = path.has_parent_path() ? path.parent_path() : ".";
+    place found{descriptor(openat(from, folder.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC)),
+                path.filename()};
+    if (found.folder.number() < 0) {
+        fail(errno, name);
+    }
+    if (found.name.empty()) {
+        fail(path.empty() ? ENOENT : EISDIR, name);
+    }
+    found.file = descriptor(
+        openat(found.folder.number(), found.name.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC));
+    if (found.file.number() < 0 && errno != ENOENT) {
+        fail(errno, name);
+    }
+    return found;
+}
+
+// Where the file is, whose folder is held open. A symbolic link in its place is followed, but not
+// another user's by root: it may lead to any file of the system.
+place resolved(const std::string& name)
+{
+    place found = placeof(name, AT_FDCWD, name);
+    while (found.file.number() >= 0) {
+        const struct stat facts = factsof(found.file, name);
+        if (!S_ISLNK(facts.st_mode)) {
+            break;
+        }
+        if (geteuid() == 0 && facts.st_uid != 0) {
+            throw std::runtime_error(name + ": a symbolic link of another user");
+        }
+        const int folder = found.folder.number();
+        descriptor target(openat(folder, found.name.c_str(), O_PATH | O_CLOEXEC));
+        if (target.number() < 0 && errno != ENOENT) {
+            fail(errno, name);
+        }
+        place next = placeof(linktext(found, name), folder, name);
+        if (next.file.number() < 0 && target.number() >= 0) { // a pipe behind /dev/stdout
+            found.file = std::move(target);
+            break;
+        }
+        found = std::move(next);
+    }
+    return found;
+}
+
+// A stream does not report why it failed; errno mostly holds the reason.
+void writethrough(const descriptor& file, const std::string& name,
+                  const std::function<void(std::ostream&)>& write)
 {
     errno = 0;
-    std::ofstream file(path, std::ios::binary | std::ios::trunc);
-    if (file) {
-        write(file);
-        file.close();
-    }
-    if (!file) {
+    __gnu_cxx::stdio_filebuf<char> buffer(fcntl(file.number(), F_DUPFD_CLOEXEC, 0),
+                                          std::ios::out | std::ios::binary);
+    std::ostream out(&buffer);
+    write(out);
+    if (!out || buffer.close() == nullptr) {
         fail(errno == 0 ? EIO : errno, name);
     }
 }
 
-// The rights that a new file has.
+// A path to a file that is held open, also after a rename.
+std::string pathof(const descriptor& file)
+{
+    return "/proc/self/fd/" + std::to_string(file.number());
+}
+
+void writeto(const descriptor& known, const std::string& name,
+             const std::function<void(std::ostream&)>& write)
+{
+    const descriptor file(open(pathof(known).c_str(), O_WRONLY | O_NOCTTY | O_CLOEXEC));
+    if (file.number() < 0) {
+        fail(errno, name);
+    }
+    writethrough(file, name, write);
+}
+
+// The mode of a new file.
 mode_t usualmode()
 {
     const mode_t mask = umask(0);
@@ -45,61 +142,117 @@ mode_t usualmode()
     return 0666U & ~mask;
 }
 
-// Gone at the end, unless it has got its name.
+// The mode of a file that replaces an old one. No user gains a right: where the group changes, or
+// an access control list is lost, group and others get what both had.
+mode_t modelike(const descriptor& old, const struct stat& facts, bool samegroup)
+{
+    const mode_t mode = facts.st_mode & 0777U;
+    const mode_t both = (mode >> 3U) & mode & 07U; // its group and others
+    const bool haslist = getxattr(pathof(old).c_str(), "system.posix_acl_access", nullptr, 0) > 0;
+    return samegroup && !haslist ? mode : (mode & 0700U) | both << 3U | both;
+}
+
+// A new file beside another, readable by its owner only. Deleted at the end unless renamed.
 class temporaryfile {
 public:
-    temporaryfile(const fs::path& beside, const std::string& name)
-        : path(beside.native() + ".XXXXXX")
+    temporaryfile(const place& beside, const std::string& name) : at(beside), asked(name)
     {
-        const int fd = mkstemp(path.data());
-        if (fd < 0) {
-            fail(errno, name);
+        constexpr int kTries = 100;
+        for (int tries = 0; tries < kTries && file.number() < 0; ++tries) {
+            own = at.name + '.' + std::to_string(std::random_device()());
+            file = descriptor(openat(at.folder.number(), own.c_str(),
+                                     O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
+            if (file.number() < 0 && errno != EEXIST) {
+                break;
+            }
         }
-        (void)fchmod(fd, usualmode());
-        (void)close(fd);
+        if (file.number() < 0) {
+            fail(errno, asked);
+        }
     }
     ~temporaryfile()
     {
-        if (!path.empty()) {
-            (void)unlink(path.c_str());
+        if (!own.empty()) {
+            (void)unlinkat(at.folder.number(), own.c_str(), 0);
         }
     }
     temporaryfile(const temporaryfile&) = delete;
     temporaryfile& operator=(const temporaryfile&) = delete;
 
-    [[nodiscard]] const std::string& where() const noexcept { return path; }
+    [[nodiscard]] const descriptor& opened() const noexcept { return file; }
 
-    void rename(const fs::path& to, const std::string& name)
+    // Takes over mode, group and owner of the old file. The owner comes last: only the owner may
+    // change the rest.
+    void takerights()
     {
-        if (std::rename(path.c_str(), to.c_str()) != 0) {
-            fail(errno, name);
+        if (at.file.number() < 0) {
+            setmode(usualmode());
+            return;
         }
-        path.clear();
+        const struct stat old = factsof(at.file, asked);
+        const bool samegroup = fchown(file.number(), static_cast<uid_t>(-1), old.st_gid) == 0;
+        setmode(modelike(at.file, old, samegroup));
+        (void)!fchown(file.number(), old.st_uid, static_cast<gid_t>(-1));
+    }
+
+    void rename()
+    {
+        const int folder = at.folder.number();
+        if (renameat(folder, own.c_str(), folder, at.name.c_str()) != 0) {
+            fail(errno, asked);
+        }
+        own.clear();
     }
 
 private:
-    std::string path;
+    void setmode(mode_t mode) const
+    {
+        if (fchmod(file.number(), mode) != 0) {
+            fail(errno, asked);
+        }
+    }
+
+    const place& at;
+    const std::string& asked;
+    std::string own;
+    descriptor file;
 };
+
+void refuseinput(const struct stat& output, const std::vector<std::string>& inputs,
+                 const std::string& name)
+{
+    const bool isstream = S_ISCHR(output.st_mode) || S_ISSOCK(output.st_mode); // one for both
+    if (!isstream && islog(inputs, output)) {
+        throw std::runtime_error(name + ": the output is also an input");
+    }
+}
 
 } // namespace
 
-void writewhole(const std::string& name, const std::function<void(std::ostream&)>& write)
+void writewhole(const std::string& name, const std::vector<std::string>& inputs,
+                const std::function<void(std::ostream&)>& write)
 {
+    struct stat facts {};
     if (name == "-") {
+        if (fstat(STDOUT_FILENO, &facts) == 0) {
+            refuseinput(facts, inputs, "standard output");
+        }
         write(std::cout);
         return;
     }
-    std::error_code ignored;
-    const bool exists = fs::exists(name, ignored);
-    if (exists && !fs::is_regular_file(name, ignored)) {
-        writeto(name, name, write);
-        return;
+    const place found = resolved(name);
+    if (found.file.number() >= 0) {
+        facts = factsof(found.file, name);
+        refuseinput(facts, inputs, name);
+        if (!S_ISREG(facts.st_mode)) {
+            writeto(found.file, name, write);
+            return;
+        }
     }
-    // A symbolic link stays one.
-    const fs::path target = exists ? fs::canonical(name) : fs::path(name);
-    temporaryfile fresh(target, name);
-    writeto(fresh.where(), name, write);
-    fresh.rename(target, name);
+    temporaryfile fresh(found, name);
+    writethrough(fresh.opened(), name, write);
+    fresh.takerights();
+    fresh.rename();
 }
 
 } // namespace report

@@ -13,6 +13,8 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include "descriptor.h"
+
 namespace report {
 
 namespace {
@@ -27,38 +29,11 @@ constexpr int kLookPauseMilliseconds = 200;
                             name == kStandardInput ? "standard input" : name);
 }
 
-// A file descriptor, closed at the end if it was opened here.
-class descriptor {
-public:
-    descriptor(int number, bool ours) : fd(number), own(ours) {}
-    ~descriptor()
-    {
-        if (own) {
-            (void)close(fd);
-        }
-    }
-    descriptor(descriptor&& other) noexcept : fd(other.fd), own(std::exchange(other.own, false)) {}
-    descriptor& operator=(descriptor&& other) noexcept
-    {
-        std::swap(fd, other.fd);
-        std::swap(own, other.own);
-        return *this;
-    }
-    descriptor(const descriptor&) = delete;
-    descriptor& operator=(const descriptor&) = delete;
-
-    [[nodiscard]] int number() const noexcept { return fd; }
-
-private:
-    int fd;
-    bool own;
-};
-
 // Waits at a named pipe until somebody writes to it, as long as `proceed` says after a signal.
 descriptor opened(const std::string& name, const std::function<bool()>& proceed)
 {
     if (name == kStandardInput) {
-        return {STDIN_FILENO, false};
+        return descriptor(STDIN_FILENO, false);
     }
     int fd = -1;
     do {
@@ -67,7 +42,7 @@ descriptor opened(const std::string& name, const std::function<bool()>& proceed)
     if (fd < 0) {
         refuse(errno, name);
     }
-    return {fd, true};
+    return descriptor(fd);
 }
 
 // Also where all has been read, or reading fails: then the next read tells.
@@ -202,7 +177,7 @@ std::optional<source> successor(const struct stat& known, const std::string& nam
     if (fd < 0) {
         return std::nullopt;
     }
-    source next({fd, true}, name);
+    source next(descriptor(fd), name);
     const struct stat facts = next.facts();
     if (!S_ISREG(facts.st_mode) || issame(facts, known)) {
         return std::nullopt;
@@ -300,6 +275,16 @@ void readlogs(const std::vector<std::string>& names, logreader& into)
         source log(opened(name, [] { return true; }), name);
         readtoend(log, into);
     }
+}
+
+bool islog(const std::vector<std::string>& names, const struct stat& file)
+{
+    return std::any_of(names.begin(), names.end(), [&](const std::string& name) {
+        struct stat facts {};
+        const int known =
+            name == kStandardInput ? fstat(STDIN_FILENO, &facts) : stat(name.c_str(), &facts);
+        return known == 0 && issame(facts, file);
+    });
 }
 
 void pausebetweenlooks()

@@ -5,6 +5,8 @@
 #include <string>
 #include <vector>
 
+#include <sys/stat.h>
+
 #include "logreader.h"
 
 namespace report {
@@ -15,6 +17,9 @@ inline constexpr const char* kStandardInput = "-"; // in place of a log's name
 // Reads the logs of these names, in order, into the reader; "-" is standard input. Throws
 // std::system_error with the file's name where one cannot be read. One thread.
 void readlogs(const std::vector<std::string>& names, logreader& into);
+
+// Whether one of the logs of these names is this file, by whatever name. Any thread.
+bool islog(const std::vector<std::string>& names, const struct stat& file);
 
 // A fifth of a second, or until a signal is caught. Any thread.
 void pausebetweenlooks();
