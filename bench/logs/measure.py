@@ -4,6 +4,8 @@ memory, beside `wc -l` on the same file, and tells the report what came of it.
 
 Whole processes, in turns: each round runs both, one right after the other. The medians of the
 rounds' times and of their ratios count. The file has been read before: it comes from memory.
+
+Then the same, once, of logs that somebody made to take memory and time.
 """
 
 import argparse
@@ -26,6 +28,11 @@ ROUNDS = 9
 START = 1795273200  # 2026-11-21 15:00 UTC
 SEED = 1
 LOOK_SECONDS = 0.005
+
+MANY_NAMES = 1_000_000
+BRIEF_NAMES = 10_000
+LONG_NAMES = 300
+BRIEF_LONG_NAMES = 3
 
 MONITOR = "DEBUG wdmonitorthread"
 NOTICE = "INFO wdmonitorthread"
@@ -110,6 +117,23 @@ def write_log(path, size):
                 return number
 
 
+def write_names(path, count, filling):
+    """A log that announces so many services, each name with so many bytes more than it needs."""
+    stamp = time.asctime(time.gmtime(START))
+    with path.open("w", encoding="ascii") as out:
+        for who in range(count):
+            for level, text in announcement(f"service{who:07}" + filling * "x"):
+                out.write(f"{stamp} {level}|TID{140000000000000 + 4096 * who} {text}\n")
+
+
+# Itself small: a process that it starts counts as being as large as this one at least.
+PEAK = """
+import os, sys
+process = os.posix_spawn(sys.argv[1], sys.argv[1:], os.environ)
+print(os.wait4(process, 0)[2].ru_maxrss, file=sys.stderr)
+"""
+
+
 class Programs:
     """What is run."""
 
@@ -138,6 +162,14 @@ class Programs:
                 time.sleep(LOOK_SECONDS)
         return peak
 
+    def hostile(self, path, *arguments):
+        """Seconds that the report takes, and its peak memory in MB."""
+        start = time.monotonic()
+        done = subprocess.run([sys.executable, "-S", "-c", PEAK, self._report, *arguments, path],
+                              check=True, stdout=subprocess.DEVNULL, stderr=subprocess.PIPE,
+                              env=os.environ | {"TZ": "UTC"}, text=True)
+        return time.monotonic() - start, int(done.stderr) * 1024 / MEGABYTE
+
     @staticmethod
     def _run(command):
         """The time of one process, and what it printed."""
@@ -160,6 +192,39 @@ def measure(programs, path, lines, rounds):
     return {"wc": statistics.median(each["wc"] for each in times),
             "report": statistics.median(each["report"] for each in times),
             "ratio": statistics.median(each["report"] / each["wc"] for each in times)}
+
+
+def hostile_results(programs, folder, brief):
+    """The table of logs that were made to harm, and their goals."""
+    rows, found = [], {}
+    path = folder / "hostile.log"
+    for name, count, filling, commands in (
+            ("short names", BRIEF_NAMES if brief else MANY_NAMES, 0,
+             (["status"], ["status", "--json"], ["events", "--json"])),
+            ("names of 1 MB", BRIEF_LONG_NAMES if brief else LONG_NAMES, MEGABYTE,
+             (["status"], ["status", "--json"]))):
+        write_names(path, count, filling)
+        for command in commands:
+            print(f"logs: {count} {name}, {' '.join(command)}", file=sys.stderr)
+            seconds, memory = programs.hostile(path, *command)
+            found[name, *command] = {"time": round(seconds, 2), "memory": round(memory, 1)}
+            rows.append([f"{count:,} {name}, {path.stat().st_size / MEGABYTE:,.0f} MB",
+                         " ".join(command), round(seconds, 2), round(memory, 1)])
+        path.unlink()
+    table = {"id": "hostile", "title": "Reading a hostile log",
+             "columns": ["", "command", "time (s)", "peak memory (MB)"], "rows": rows,
+             "note": "Whole processes, once each. Every service is announced with its path by a "
+             "thread of its own."}
+    goals = [{"id": "logs-names", "text": "peak memory of telling the state of a million services",
+              "measured": found["short names", "status"]["memory"], "limit": 300, "unit": "MB",
+              "sense": "at most"},
+             {"id": "logs-names-json", "text": "peak memory of telling it as JSON",
+              "measured": found["short names", "status", "--json"]["memory"], "limit": 400,
+              "unit": "MB", "sense": "at most"},
+             {"id": "logs-long-names", "text": "telling the state of 300 services with names of "
+              "1 MB", "measured": found["names of 1 MB", "status"]["time"], "limit": 3,
+              "unit": "s", "sense": "at most"}]
+    return table, goals
 
 
 def results(programs, folder, large, rounds):
@@ -187,7 +252,8 @@ def results(programs, folder, large, rounds):
              {"id": "logs-large", "text": "telling the state from a log of 1 GB, to the time of "
               "wc -l", "measured": round(found["large"]["ratio"], 3), "limit": 3.0,
               "unit": "ratio", "sense": "at most"}]
-    return {"tables": [table], "curves": [], "goals": goals}
+    hostile_table, hostile_goals = hostile_results(programs, folder, large == BRIEF_BYTES)
+    return {"tables": [table, hostile_table], "curves": [], "goals": goals + hostile_goals}
 
 
 def parse_arguments():

@@ -214,6 +214,12 @@ def test_json_has_its_form(run, name):
         assert has_form(json.loads(text), {"version": int, **EVENT}), text
 
 
+@pytest.mark.parametrize("name", LOGS)
+def test_json_is_laid_out_as_one_document(run, name):
+    text = run("status", "--json", log=LOGS[name]).stdout
+    assert text == json.dumps(json.loads(text), indent=2) + "\n"
+
+
 def test_a_log_without_a_time_tells_none(run):
     said = json.loads(run("status", "--json", log=UNTIMED).stdout)
     assert (said["log"]["from"], said["log"]["to"], said["log"]["messages"]) == (None, None, 1)
@@ -396,12 +402,6 @@ def test_a_page_is_whole_or_not_there(run, tmp_path):
     assert [each.name for each in tmp_path.iterdir()] == ["page.html"]
 
 
-class Follower:
-    """The program with --follow, line by line."""
-
-    def __init__(self, program, folder, *arguments):
-        self.process = subprocess.Popen(
-            [program, "events", "--follow", *arguments], cwd=folder, stdin=subprocess.DEVNULL,
 def test_a_page_never_replaces_its_log(program, run, tmp_path):
     log = tmp_path / "evil.log"
     log.write_text(GIVEN_UP)
@@ -425,6 +425,12 @@ def test_a_page_goes_to_a_pipe_that_has_no_name(run, output):
     assert run("html", "-o", output, log=GIVEN_UP).stdout.startswith("<!DOCTYPE html>")
 
 
+class Follower:
+    """The program with --follow, line by line."""
+
+    def __init__(self, program, folder, *arguments):
+        self.process = subprocess.Popen(
+            [program, "events", "--follow", *arguments], cwd=folder, stdin=subprocess.DEVNULL,
             stdout=subprocess.PIPE, stderr=subprocess.PIPE, env={**os.environ, **ZONE})
         self.pending = b""
 

@@ -72,7 +72,7 @@ TEST_P(Noise, LeavesSpansThatTouchAndFiguresThatAgree)
         told.play({each});
     }
     told.teller().conclude(report::at(each.at + 2), true);
-    const std::vector<account>& accounts = told.teller().accounts();
+    const std::vector<account> accounts = told.accounts();
     ASSERT_LE(told.allspans().size(), accounts.size());
     for (std::size_t service = 0; service < told.allspans().size(); ++service) {
         const std::vector<span>& spans = told.allspans()[service];
@@ -106,8 +106,8 @@ TEST_P(Noise, IsHeardTheSameWhoeverAsksMeanwhile)
     }
     asked.teller().conclude(report::at(each.at + 2), false);
     unasked.teller().conclude(report::at(each.at + 2), false);
-    const std::vector<account>& one = asked.teller().accounts();
-    const std::vector<account>& other = unasked.teller().accounts();
+    const std::vector<account> one = asked.accounts();
+    const std::vector<account> other = unasked.accounts();
     ASSERT_EQ(one.size(), other.size());
     for (std::size_t service = 0; service < one.size(); ++service) {
         EXPECT_EQ(one[service].now.what, other[service].now.what);
@@ -128,7 +128,7 @@ TEST_P(Noise, TellsEachMessageOnce)
     int sources = 0;
     for (const event& each : told.allevents()) {
         sources += each.source == nullptr ? 0 : 1;
-        ASSERT_TRUE(!each.service || *each.service < told.teller().accounts().size());
+        ASSERT_TRUE(!each.service || *each.service < told.teller().services());
     }
     EXPECT_EQ(sources, kLines);
 }

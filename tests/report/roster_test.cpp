@@ -84,6 +84,36 @@ TEST(Roster, KeepsTheLastFewThreadsOfAService)
     EXPECT_EQ(who.watchers(web, 2), 0U);
 }
 
+TEST(Roster, KeepsTheThreadsBeforeOneThatIsGone)
+{
+    roster who;
+    const serviceid web = who.add("web");
+    for (const std::uint64_t number : {1U, 2U, 3U}) {
+        who.tie(thread(number), web, 1);
+    }
+    who.untie(thread(3));
+    who.tie(thread(4), web, 1);
+    EXPECT_EQ(who.watchers(web, 1), 3U);
+    who.tie(thread(5), web, 1);
+    EXPECT_EQ(who.bythread(thread(1)), nullptr);
+    EXPECT_EQ(who.watchers(web, 1), 3U);
+}
+
+TEST(Roster, KeepsNameAndPathWhicheverChanges)
+{
+    roster who;
+    const serviceid one = who.addnameless("(/one)", "/one");
+    const serviceid web = who.add("web");
+    EXPECT_EQ(who.nameof(one), "(/one)");
+    EXPECT_EQ(who.byname("(/one)"), std::nullopt);
+    who.name(one, "mail");
+    who.setpath(web, "/web");
+    EXPECT_EQ(who.byname("mail"), one);
+    EXPECT_EQ(who.pathof(one), "/one");
+    EXPECT_EQ(who.bypath("/one"), one);
+    EXPECT_EQ(who.nameof(web), "web");
+}
+
 TEST(Roster, FollowsAPathFromServiceToService)
 {
     roster who;

@@ -54,7 +54,13 @@ overview seen(std::vector<account> services)
 {
     overview result;
     result.files = {"tolkwd.log"};
-    result.services = std::move(services);
+    result.services = static_cast<serviceid>(services.size());
+    result.accountof = [services](serviceid service) {
+        return services.at(service);
+    };
+    result.nameof = [services = std::move(services)](serviceid service) -> std::string_view {
+        return services.at(service).name;
+    };
     result.count.lines = 100;
     result.count.messages = 100;
     result.count.first = ago(kDay);

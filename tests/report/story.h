@@ -119,14 +119,24 @@ public:
         return shown(of(name).now);
     }
 
-    const account& of(const std::string& name) const { return told.accounts().at(idof(name)); }
+    account of(const std::string& name) const { return told.accountof(idof(name)); }
+
+    // All services, in the order in which the log names them.
+    std::vector<account> accounts() const
+    {
+        std::vector<account> result;
+        for (serviceid service = 0; service < told.services(); ++service) {
+            result.push_back(told.accountof(service));
+        }
+        return result;
+    }
 
     // The names, in order.
     std::vector<std::string> names() const
     {
         std::vector<std::string> result;
-        for (const account& each : told.accounts()) {
-            result.push_back(each.name);
+        for (serviceid service = 0; service < told.services(); ++service) {
+            result.emplace_back(told.nameof(service));
         }
         return result;
     }
@@ -148,12 +158,11 @@ public:
     const std::vector<std::vector<span>>& allspans() const { return spans; }
 
 private:
-    std::size_t idof(const std::string& name) const
+    serviceid idof(const std::string& name) const
     {
-        const auto& all = told.accounts();
-        const auto found = std::find_if(all.begin(), all.end(),
-                                        [&](const account& each) { return each.name == name; });
-        return static_cast<std::size_t>(found - all.begin());
+        const std::vector<std::string> all = names();
+        const auto found = std::find(all.begin(), all.end(), name);
+        return static_cast<serviceid>(found - all.begin());
     }
 
     static std::string shown(const span& one)
@@ -165,7 +174,7 @@ private:
     std::string shown(const event& one) const
     {
         std::string result = std::to_string(one.when.elapsed) + " ";
-        result += one.service ? told.accounts().at(*one.service).name : "-";
+        result += one.service ? told.nameof(*one.service) : "-";
         result += " " + std::string(wordof(one.kind));
         if (one.became) {
             result += " " + std::string(wordof(*one.became));

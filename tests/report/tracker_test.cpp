@@ -1,6 +1,7 @@
 #include "tracker.h"
 
 #include <algorithm>
+#include <ctime>
 #include <string>
 #include <vector>
 
@@ -746,6 +747,103 @@ TEST(Clock, OfLinesThatStandOutOfOrderDoesNotGoBack)
     told.hear({0, kOne, kCheckBegins, "/web"}, at(61));
     told.hear({0, kOne, kCheckFailed, "web"}, at(60));
     EXPECT_EQ(told.finish("web", 70), "up* 0-61, functional-failure 61-70");
+}
+
+TEST(Name, OfMoreThanFourKibibytesIsCutBetweenCharacters)
+{
+    const auto cut = [](std::size_t size, const std::string& behind) {
+        const std::string known = report::knownname(std::string(size, 'x') + behind);
+        return known.substr(known.find_last_of('x') + 1);
+    };
+    EXPECT_EQ(cut(4095, "y"), "y");
+    EXPECT_EQ(cut(4096, "y"), "...");
+    EXPECT_EQ(cut(4096, "\u00e9"), "...");
+    EXPECT_EQ(cut(4095, "\u00e9"), "...");
+    EXPECT_EQ(cut(4094, "\u00e9y"), "\u00e9...");
+    EXPECT_EQ(cut(4093, "\U0001f600"), "...");
+    EXPECT_EQ(cut(4092, "\U0001f600y"), "\U0001f600...");
+    EXPECT_EQ(report::knownname(std::string(4097, '\x80')), std::string(4093, '\x80') + "...");
+}
+
+TEST(Name, IsKnownByItsFirstFourKibibytesWhereverItStands)
+{
+    const std::string begin(4096, 'x');
+    const std::string path = "/" + begin;
+    story told(announced(0, kOne, begin + "one", path + "one"));
+    told.play({{1, kTwo, kServiceFailed, begin + "two"},
+               {2, kThree, kStatusAnswered, "service " + begin + "three status 1>a 2>a"},
+               {3, kMain, kRecoveryTried, begin + "four"},
+               {4, kMain + 1, kCheckBegins, path + "five"}});
+    EXPECT_THAT(told.names(), ElementsAre(begin + "..."));
+    told.finish(begin + "...", 5);
+    EXPECT_EQ(told.of(begin + "...").path, path.substr(0, 4096) + "...");
+}
+
+// Very many services, of a hostile log: what a message costs does not depend on their number. Else
+// each of these takes a minute.
+constexpr int kManyServices = 100000;
+constexpr std::clock_t kMostSeconds = 20; // of processor time
+
+class Hostile : public testing::Test {
+protected:
+    ~Hostile() override { EXPECT_LT(seconds(), kMostSeconds); }
+
+    [[nodiscard]] std::clock_t seconds() const { return (std::clock() - begin) / CLOCKS_PER_SEC; }
+
+    void hear(std::int64_t when, std::int64_t clock, report::messageid id,
+              const std::string& first = {})
+    {
+        report::message said;
+        said.id = id;
+        said.thread = ++threads;
+        said.when = {clock, when};
+        said.first = first;
+        told.hear(said);
+    }
+
+    report::tracker told{{}};
+    std::uint64_t threads = 0;
+    const std::clock_t begin = std::clock();
+};
+
+TEST_F(Hostile, LoadsFailBetweenAnnouncements)
+{
+    for (int each = 0; each < kManyServices && seconds() < kMostSeconds; ++each) {
+        hear(0, 0, kServiceNamed, std::to_string(each));
+        hear(0, 0, kLoadFailed);
+    }
+}
+
+TEST_F(Hostile, EachServiceIsOfAnotherGeneration)
+{
+    for (int each = 0; each < kManyServices && seconds() < kMostSeconds; ++each) {
+        hear(60 * each, 60 * each, kServiceNamed, std::to_string(each));
+    }
+}
+
+TEST_F(Hostile, TheClockIsSetAgainAndAgain)
+{
+    for (int each = 0; each < kManyServices && seconds() < kMostSeconds; ++each) {
+        hear(0, each % 2 * 1000, kServiceNamed, std::to_string(each));
+    }
+}
+
+TEST_F(Hostile, NoPathFollowsTheAnnouncements)
+{
+    hear(0, 0, kCheckBegins, "/path");
+    for (int each = 0; each < 3 * kManyServices && seconds() < kMostSeconds; ++each) {
+        hear(0, 0, kServiceNamed, std::to_string(each));
+    }
+}
+
+TEST(Daemon, ThatEndsLeavesTheServicesInTheirOrder)
+{
+    story told(announced(0, kOne, "web", "/web") + announced(0, kTwo, "mail", "/mail") +
+               std::vector<line>{{100, 0, kNoLog}} + announced(200, kThree, "mail", "/mail") +
+               announced(200, kOne, "web", "/web") + std::vector<line>{{300, 0, kNoLog}});
+    EXPECT_THAT(told.happened({eventkind::kUnwatched}),
+                ElementsAre("100 web unwatched not-watched", "100 mail unwatched not-watched",
+                            "300 web unwatched not-watched", "300 mail unwatched not-watched"));
 }
 
 TEST(Events, TellEachMessageOnceAndInferredStatesWithoutOne)

@@ -76,9 +76,13 @@ std::size_t bytesin(std::string_view text, std::size_t most) noexcept
 // A tab would tear the columns of a table apart.
 std::string inoneline(std::string_view text)
 {
-    std::string shown = tools::printable(text);
-    for (auto tab = shown.find('\t'); tab != std::string::npos; tab = shown.find('\t', tab)) {
-        shown.replace(tab, 1, "\\x09");
+    std::string shown;
+    for (const char byte : tools::printable(text)) {
+        if (byte == '\t') {
+            shown += "\\x09";
+        } else {
+            shown += byte;
+        }
     }
     return shown;
 }

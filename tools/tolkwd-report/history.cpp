@@ -19,30 +19,38 @@ public:
 
     logreader& reader() noexcept { return lines; }
 
-    const std::vector<account>& conclude()
+    const tracker& conclude()
     {
         model.conclude(lines.count().last, true);
-        return model.accounts();
+        return model;
     }
 
 private:
-    [[nodiscard]] const std::string* nameof(const event& what) const
+    const std::string* nameof(const event& what)
     {
-        return what.service ? &model.accounts().at(*what.service).name : nullptr;
+        if (!what.service) {
+            return nullptr;
+        }
+        name = model.nameof(*what.service);
+        return &name;
     }
 
     tracker model;
     logreader lines;
+    std::string name; // of the event that is told
 };
 
 } // namespace
 
-std::vector<account> readhistory(const std::vector<std::string>& names, wanted which,
-                                 const eventlistener& told)
+void readhistory(const std::vector<std::string>& names, wanted which, const eventlistener& told,
+                 const std::function<void(std::string_view)>& named)
 {
     chain all(which, told);
     readingalog([&] { readlogs(names, all.reader()); });
-    return all.conclude();
+    const tracker& model = all.conclude();
+    for (serviceid service = 0; service < model.services(); ++service) {
+        named(model.nameof(service));
+    }
 }
 
 void followhistory(const std::vector<std::string>& names, wanted which, const eventlistener& told,

@@ -74,6 +74,22 @@ ordered_json saidjson(const message* said)
     return tools::textjson(text);
 }
 
+constexpr int kIndent = 2;
+
+// `text`, which is JSON, so many levels deeper: strings in JSON hold no newline.
+std::string indented(const std::string& text, std::size_t levels)
+{
+    const std::string blanks(levels * kIndent, ' ');
+    std::string result = blanks;
+    for (const char byte : text) {
+        result += byte;
+        if (byte == '\n') {
+            result += blanks;
+        }
+    }
+    return result;
+}
+
 // Text that steers no terminal, with an indent of `indent` blanks, or in one line if that is -1.
 std::string textof(const ordered_json& document, int indent)
 {
@@ -83,17 +99,18 @@ std::string textof(const ordered_json& document, int indent)
 
 } // namespace
 
-std::string statusjson(const overview& seen)
+// One service after the other: a log may name a million.
+void writestatusjson(std::ostream& out, const overview& seen)
 {
-    ordered_json services = ordered_json::array();
-    for (const account& each : seen.services) {
-        services.push_back(servicejson(each, seen.judged));
+    out << "{\n" << indented(R"("version": )" + textof(kFormatVersion, kIndent), 1);
+    out << ",\n" << indented(R"("log": )" + textof(logjson(seen), kIndent), 1);
+    out << ",\n" << indented(R"("loadfailed": )" + textof(seen.loadfailed, kIndent), 1);
+    out << ",\n" << indented(R"("services": [)", 1);
+    for (serviceid service = 0; service < seen.services; ++service) {
+        const ordered_json one = servicejson(seen.accountof(service), seen.judged);
+        out << (service == 0 ? "\n" : ",\n") << indented(textof(one, kIndent), 2);
     }
-    return textof({{"version", kFormatVersion},
-                   {"log", logjson(seen)},
-                   {"loadfailed", seen.loadfailed},
-                   {"services", services}},
-                  2);
+    out << (seen.services == 0 ? "" : "\n" + indented("", 1)) << "]\n}\n";
 }
 
 std::string eventjson(const event& what, const std::string* name, std::string_view words,

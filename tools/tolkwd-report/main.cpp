@@ -12,6 +12,7 @@
 #include <iostream>
 #include <iterator>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <system_error>
@@ -64,7 +65,7 @@ int runstatus(const options& chosen)
 {
     const overview seen = readoverview(chosen.logs, chosen.asofnow, {});
     if (chosen.json) {
-        std::cout << statusjson(seen) << '\n';
+        writestatusjson(std::cout, seen);
     } else {
         writestatus(std::cout, seen, outputcolumns(), tools::colourwanted());
     }
@@ -74,8 +75,10 @@ int runstatus(const options& chosen)
 // The expressions have been checked before.
 eventfilter filterof(const options& chosen)
 {
-    eventfilter filter{.services = {chosen.services.begin(), chosen.services.end()},
-                       .all = chosen.all};
+    eventfilter filter{.all = chosen.all};
+    for (const std::string& name : chosen.services) {
+        filter.services.insert(knownname(name));
+    }
     for (const std::string& word : chosen.kinds) {
         if (const auto kind = eventkindof(word)) {
             filter.kinds.insert(*kind);
@@ -110,12 +113,10 @@ int endwithoutreader()
 }
 
 // A name that nobody has may be misspelt.
-void noteunknown(const options& chosen, const std::vector<account>& known)
+void noteunknown(const options& chosen, const std::set<std::string, std::less<>>& unknown)
 {
     for (const std::string& name : chosen.services) {
-        const bool found = std::any_of(known.begin(), known.end(),
-                                       [&](const account& each) { return each.name == name; });
-        if (!found) {
+        if (unknown.contains(knownname(name))) {
             std::cerr << "tolkwd-report: the log names no service " << tools::inquotes(name)
                       << '\n';
         }
@@ -131,7 +132,13 @@ int runevents(const options& chosen)
         writer.told(what, name);
     };
     if (!chosen.follow) {
-        noteunknown(chosen, readhistory(chosen.logs, which, told));
+        auto unknown = filter.services;
+        readhistory(chosen.logs, which, told, [&unknown](std::string_view name) {
+            if (const auto found = unknown.find(name); found != unknown.end()) {
+                unknown.erase(found);
+            }
+        });
+        noteunknown(chosen, unknown);
         writer.end();
         return 0;
     }

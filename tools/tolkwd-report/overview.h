@@ -4,6 +4,7 @@
 #include <functional>
 #include <stdexcept>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "logreader.h"
@@ -26,11 +27,13 @@ inline bool hastime(const readcount& count) noexcept
 struct overview {
     std::vector<std::string> files{}; // as they were given
     readcount count{};
-    std::vector<account> services{}; // in the order in which the log names them
-    bool loadfailed = false;         // see tracker
-    instant judged{};                // as of when all this holds
-    bool asofnow = false;            // that is the present, not the log's last line
-    instant present{};               // as far as the log's last line tells
+    serviceid services = 0; // how many there are, in the order in which the log names them
+    std::function<std::string_view(serviceid)> nameof{}; // one's name
+    std::function<account(serviceid)> accountof{};       // and all that is known of it
+    bool loadfailed = false;                             // see tracker
+    instant judged{};                                    // as of when all this holds
+    bool asofnow = false; // that is the present, not the log's last line
+    instant present{};    // as far as the log's last line tells
 };
 
 // Reads the logs of these names and judges as of their last line, or `asofnow`, the present. What

@@ -172,11 +172,13 @@ json logjson(const pagecontents& contents, const timebase& base)
 // In a script element nothing may look like a tag.
 void writejson(std::ostream& out, const json& value)
 {
-    std::string text = value.dump();
-    for (std::size_t place = 0; (place = text.find('<', place)) != std::string::npos;) {
-        text.replace(place, 1, "\\u003c");
+    for (const char byte : value.dump()) {
+        if (byte == '<') {
+            out << "\\u003c";
+        } else {
+            out << byte;
+        }
     }
-    out << text;
 }
 
 // Begins the next member of the data.

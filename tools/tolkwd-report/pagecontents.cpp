@@ -42,13 +42,14 @@ public:
 
     pagecontents contents(overview seen) &&
     {
-        spans.resize(seen.services.size());
+        spans.resize(seen.services);
         pagecontents result;
         result.files = std::move(seen.files);
         result.count = seen.count;
         result.loadfailed = seen.loadfailed;
-        for (std::size_t i = 0; i < spans.size(); ++i) {
-            result.services.push_back({std::move(seen.services[i]), std::move(spans[i])});
+        result.services.reserve(seen.services);
+        for (serviceid service = 0; service < seen.services; ++service) {
+            result.services.push_back({seen.accountof(service), std::move(spans[service])});
         }
         // An inferred event is told later than it happened.
         std::stable_sort(marks.begin(), marks.end(),

@@ -1,12 +1,19 @@
 #include "roster.h"
 
 #include <algorithm>
+#include <functional>
+#include <utility>
 
 namespace report {
 
 namespace {
 
 constexpr std::size_t kFirstPlaces = 256;
+
+std::size_t hashof(std::string_view text)
+{
+    return std::hash<std::string_view>{}(text);
+}
 
 } // namespace
 
@@ -65,36 +72,54 @@ void threadtable::grow()
     }
 }
 
+std::size_t roster::namehash::operator()(std::string_view name) const
+{
+    return hashof(name);
+}
+
+std::size_t roster::namehash::operator()(serviceid service) const
+{
+    return hashof(who->nameof(service));
+}
+
+bool roster::samename::operator()(std::string_view name, serviceid service) const
+{
+    return name == who->nameof(service);
+}
+
 std::optional<serviceid> roster::byname(std::string_view name) const
 {
     const auto found = names.find(name);
-    return found == names.end() ? std::nullopt : std::optional(found->second);
+    return found == names.end() ? std::nullopt : std::optional(*found);
 }
 
 std::optional<serviceid> roster::bypath(std::string_view path) const
 {
-    const auto found = paths.find(path);
-    return found == paths.end() || found->second.count != 1 ? std::nullopt
-                                                            : std::optional(found->second.ids);
+    const auto found = paths.find(hashof(path));
+    const bool isone = found != paths.end() && found->second.count == 1;
+    return isone && pathof(found->second.ids) == path ? std::optional(found->second.ids)
+                                                      : std::nullopt;
 }
 
 bool roster::knowspath(std::string_view path) const
 {
-    return paths.find(path) != paths.end();
+    return paths.contains(hashof(path));
 }
 
 serviceid roster::add(std::string_view name)
 {
     const auto result = static_cast<serviceid>(services.size());
-    services.emplace_back();
-    names.emplace(name, result);
+    settexts(services.emplace_back(), name, {});
+    names.insert(result);
     return result;
 }
 
-serviceid roster::addnameless(std::string_view path)
+serviceid roster::addnameless(std::string_view standin, std::string_view path)
 {
     const auto result = static_cast<serviceid>(services.size());
-    services.emplace_back().nameless = true;
+    watched& added = services.emplace_back();
+    added.nameless = true;
+    settexts(added, standin, {});
     ++nameless;
     setpath(result, path);
     return result;
@@ -102,31 +127,43 @@ serviceid roster::addnameless(std::string_view path)
 
 void roster::name(serviceid service, std::string_view name)
 {
-    if (services.at(service).nameless) {
-        services.at(service).nameless = false;
+    watched& one = services.at(service);
+    if (one.nameless) {
+        one.nameless = false;
         --nameless;
-        names.emplace(name, service);
+        settexts(one, name, pathof(service));
+        names.insert(service);
     }
 }
 
 void roster::setpath(serviceid service, std::string_view path)
 {
-    std::string& known = services.at(service).path;
+    const std::string_view known = pathof(service);
     if (known == path) {
         return;
     }
-    if (const auto before = paths.find(known); before != paths.end()) {
+    if (const auto before = paths.find(hashof(known)); !known.empty() && before != paths.end()) {
         before->second.ids ^= service;
         if (--before->second.count == 0) {
             paths.erase(before);
         }
     }
-    known = path;
+    settexts(services.at(service), nameof(service), path);
     if (!path.empty()) {
-        owners& all = paths[known];
+        owners& all = paths[hashof(path)];
         ++all.count;
         all.ids ^= service;
     }
+}
+
+// The texts may be parts of those that it has.
+void roster::settexts(watched& one, std::string_view name, std::string_view path)
+{
+    auto texts = std::make_unique_for_overwrite<char[]>(name.size() + path.size());
+    path.copy(texts.get() + name.copy(texts.get(), name.size()), path.size());
+    one.namebytes = static_cast<std::uint16_t>(name.size());
+    one.pathbytes = static_cast<std::uint16_t>(path.size());
+    one.texts = std::move(texts);
 }
 
 void roster::tie(std::uint64_t thread, serviceid service, std::uint32_t generation)
@@ -135,12 +172,18 @@ void roster::tie(std::uint64_t thread, serviceid service, std::uint32_t generati
     if (known == nullptr || known->service != service) {
         untie(thread);
         watched& watcher = services.at(service);
-        std::uint64_t& kept = watcher.threads.at(watcher.next);
-        watcher.next = (watcher.next + 1) % kThreadsKept;
-        if (kept != 0) {
-            threads.remove(kept);
+        if (watcher.thread != 0 && !watcher.before) {
+            watcher.before = std::make_unique<std::array<std::uint64_t, kThreadsKept - 1>>();
         }
-        kept = thread;
+        if (watcher.before) {
+            auto& before = *watcher.before;
+            if (before.back() != 0) {
+                threads.remove(before.back());
+            }
+            std::shift_right(before.begin(), before.end(), 1);
+            before.front() = watcher.thread;
+        }
+        watcher.thread = thread;
     }
     threads.set({thread, service, generation});
 }
@@ -149,20 +192,26 @@ void roster::untie(std::uint64_t thread)
 {
     const threadtable::entry* const known = threads.find(thread);
     if (known != nullptr) {
-        auto& kept = services.at(known->service).threads;
-        std::replace(kept.begin(), kept.end(), thread, std::uint64_t{0});
+        watched& watcher = services.at(known->service);
+        if (watcher.thread == thread) {
+            watcher.thread = 0;
+        } else if (watcher.before) {
+            std::replace(watcher.before->begin(), watcher.before->end(), thread, std::uint64_t{0});
+        }
         threads.remove(thread);
     }
 }
 
 std::size_t roster::watchers(serviceid service, std::uint32_t generation) const
 {
-    const auto& kept = services.at(service).threads;
-    return static_cast<std::size_t>(
-        std::count_if(kept.begin(), kept.end(), [&](std::uint64_t thread) {
-            const threadtable::entry* const known = threads.find(thread);
-            return known != nullptr && known->generation == generation;
-        }));
+    const watched& watcher = services.at(service);
+    const auto speaks = [&](std::uint64_t thread) {
+        const threadtable::entry* const known = threads.find(thread);
+        return known != nullptr && known->generation == generation;
+    };
+    const std::ptrdiff_t others =
+        watcher.before ? std::count_if(watcher.before->begin(), watcher.before->end(), speaks) : 0;
+    return static_cast<std::size_t>(others) + (speaks(watcher.thread) ? 1 : 0);
 }
 
 } // namespace report

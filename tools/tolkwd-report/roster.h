@@ -5,11 +5,12 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
-#include <functional>
+#include <deque>
+#include <memory>
 #include <optional>
-#include <string>
 #include <string_view>
 #include <unordered_map>
+#include <unordered_set>
 #include <vector>
 
 #include "tracker.h"
@@ -65,9 +66,14 @@ private:
     std::size_t used = 0;
 };
 
-// One thread.
+// One thread. Names and paths have at most 65,535 bytes.
 class roster {
 public:
+    roster() = default;
+    ~roster() = default;
+    roster(const roster&) = delete;
+    roster& operator=(const roster&) = delete;
+
     // All that can be found; none where there is no such service, or the path is that of several.
     [[nodiscard]] std::optional<serviceid> byname(std::string_view name) const;
     [[nodiscard]] std::optional<serviceid> bypath(std::string_view path) const;
@@ -80,8 +86,9 @@ public:
     // A new service; its id is the number of those before. The name must not be another's.
     serviceid add(std::string_view name);
 
-    // A new service of which only the path is known. It has no name yet, and is not found by one.
-    serviceid addnameless(std::string_view path);
+    // A new service of which only the path is known. Until it has a name it goes by `standin`, and
+    // is not found by that.
+    serviceid addnameless(std::string_view standin, std::string_view path);
 
     // Whether there are services without a name, and whether this is one.
     [[nodiscard]] bool hasnameless() const noexcept { return nameless != 0; }
@@ -90,9 +97,16 @@ public:
     // Gives it a name, which must not be another's.
     void name(serviceid service, std::string_view name);
 
-    [[nodiscard]] const std::string& pathof(serviceid service) const
+    // Valid until its name or its path changes.
+    [[nodiscard]] std::string_view nameof(serviceid service) const
     {
-        return services.at(service).path;
+        const watched& one = services.at(service);
+        return {one.texts.get(), one.namebytes};
+    }
+    [[nodiscard]] std::string_view pathof(serviceid service) const
+    {
+        const watched& one = services.at(service);
+        return {one.texts.get() + one.namebytes, one.pathbytes};
     }
     void setpath(serviceid service, std::string_view path);
 
@@ -107,35 +121,44 @@ private:
     // More than one only where several targets name the same service, and of former generations.
     static constexpr std::size_t kThreadsKept = 4;
 
+    // A log may name a million services: each text is kept once, and nothing that few of them need.
     struct watched {
-        std::string path;
+        std::unique_ptr<char[]> texts; // the name, and the path behind it
+        std::uint16_t namebytes = 0;
+        std::uint16_t pathbytes = 0;
         bool nameless = false;
-        std::size_t next = 0; // where the next thread goes
-        std::array<std::uint64_t, kThreadsKept> threads{};
+        std::uint64_t thread = 0; // the one that was tied last, and those before it
+        std::unique_ptr<std::array<std::uint64_t, kThreadsKept - 1>> before;
+    };
+
+    // Finds ids by the names that the services have.
+    struct namehash {
+        using is_transparent = void;
+        const roster* who;
+        std::size_t operator()(std::string_view name) const;
+        std::size_t operator()(serviceid service) const;
+    };
+    struct samename {
+        using is_transparent = void;
+        const roster* who;
+        bool operator()(serviceid one, serviceid other) const { return one == other; }
+        bool operator()(std::string_view name, serviceid service) const;
     };
 
     // How many services have a path, and all their ids, one exclusive-or the other: of one service
     // that is its id.
     struct owners {
-        std::size_t count = 0;
+        std::uint32_t count = 0;
         serviceid ids = 0;
     };
 
-    struct texthash {
-        using is_transparent = void;
-        std::size_t operator()(std::string_view text) const noexcept
-        {
-            return std::hash<std::string_view>{}(text);
-        }
-    };
-    template <typename Value>
-    using textmap = std::unordered_map<std::string, Value, texthash, std::equal_to<>>;
-
-    std::vector<watched> services;
-    textmap<serviceid> names;
-    textmap<owners> paths;
+    std::deque<watched> services;
+    std::unordered_set<serviceid, namehash, samename> names{0, namehash{this}, samename{this}};
+    std::unordered_map<std::size_t, owners> paths; // by the path's hash
     threadtable threads;
     std::size_t nameless = 0;
+
+    void settexts(watched& one, std::string_view name, std::string_view path);
 };
 
 } // namespace report

@@ -349,9 +349,9 @@ bool servicestate::isanothers(const instant& when) const noexcept
 instant servicestate::lastretry() const noexcept
 {
     const instant result = later(failed, lastretryseconds(now.what));
-    if (clockchange && secondsbetween(failed, *clockchange) > 0 &&
-        secondsbetween(*clockchange, result) >= 0) {
-        return later(*clockchange, secondsbetween(*clockchange, result));
+    const std::optional<instant>& changed = *clockchange;
+    if (changed && secondsbetween(failed, *changed) > 0 && secondsbetween(*changed, result) >= 0) {
+        return later(*changed, secondsbetween(*changed, result));
     }
     return result;
 }

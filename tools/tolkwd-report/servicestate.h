@@ -48,6 +48,10 @@ struct turns {
 // thread.
 class servicestate {
 public:
+    // `changed`: when the log's clock was changed last, if ever; outlives this. What is inferred to
+    // have been later is dated by the new clock.
+    explicit servicestate(const std::optional<instant>& changed) noexcept : clockchange(&changed) {}
+
     // Whether a message of this kind, about the service, can change its state or its figures.
     static bool tells(messageid id) noexcept;
 
@@ -66,10 +70,6 @@ public:
     // No thread watches the service from `when` on. Unless the daemon has ended, which may be at
     // any moment, its thread had come to the end of its round first.
     void unwatch(const instant& when, bool inferred, inference why, bool steps, turns& told);
-
-    // The log's clock was changed; `when` is the first moment after that. What is inferred to have
-    // been later is dated by the new clock.
-    void changeclock(const instant& when) noexcept { clockchange = when; }
 
     // Draws the conclusions that silence up to `when` allows, and ends the last span there. Nothing
     // may be heard after it.
@@ -126,7 +126,7 @@ private:
     instant announced;
     instant failed;
     instant checkbegan;
-    std::optional<instant> clockchange; // the last one
+    const std::optional<instant>* clockchange;
 
     // Of the spans that stand.
     bool wasoutage = false;

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <numeric>
 #include <string>
 #include <string_view>
 #include <tuple>
@@ -144,47 +145,53 @@ std::string availabilitytext(const account& service)
 struct column {
     std::string_view header;
     bool right = false; // for numbers
-    std::vector<std::string> cells{};
-
-    [[nodiscard]] std::size_t width() const
-    {
-        std::size_t most = columnsof(header);
-        for (const std::string& cell : cells) {
-            most = std::max(most, columnsof(cell));
-        }
-        return most;
-    }
+    std::size_t width = 0;
 };
 
 // In the order in which the lines have them.
 enum place : std::size_t { kName, kState, kSince, kLast, kOutages, kRecoveries, kSkips, kShare };
+constexpr std::size_t kColumns = kShare + 1;
 
-using rows = std::vector<const account*>;
+// What a line has in each column.
+using cells = std::array<std::string, kColumns>;
 
-rows sorted(const std::vector<account>& services)
+using rows = std::vector<serviceid>;
+
+rows sorted(const overview& seen)
 {
-    rows result;
-    result.reserve(services.size());
-    for (const account& each : services) {
-        result.push_back(&each);
+    std::vector<state> states;
+    states.reserve(seen.services);
+    for (serviceid service = 0; service < seen.services; ++service) {
+        states.push_back(seen.accountof(service).now.what);
     }
-    std::stable_sort(result.begin(), result.end(), [](const account* one, const account* other) {
-        return std::tie(other->now.what, one->name) < std::tie(one->now.what, other->name);
+    rows result(seen.services);
+    std::iota(result.begin(), result.end(), serviceid{0});
+    std::sort(result.begin(), result.end(), [&](serviceid one, serviceid other) {
+        return states[one] != states[other]
+                   ? states[one] > states[other]
+                   : std::tuple(seen.nameof(one), one) < std::tuple(seen.nameof(other), other);
     });
     return result;
 }
 
+// Makes each line twice, to measure it and to write it: a million would take too much memory.
 class table {
 public:
-    table(const overview& all, const rows& lines, room taken) : seen(all), how(taken)
+    table(const overview& all, room taken) : seen(all), how(taken)
     {
         if (how.fulltimes) {
             columns[kRecoveries].header = "RECOVERED";
             columns[kSkips].header = "SKIPPED";
             columns[kShare].header = "AVAILABLE";
         }
-        for (const account* each : lines) {
-            add(*each);
+        for (column& each : columns) {
+            each.width = columnsof(each.header);
+        }
+        for (serviceid service = 0; service < seen.services; ++service) {
+            const cells line = cellsof(seen.accountof(service));
+            for (std::size_t i = 0; i < kColumns; ++i) {
+                columns.at(i).width = std::max(columns.at(i).width, columnsof(line.at(i)));
+            }
         }
     }
 
@@ -193,46 +200,48 @@ public:
     {
         std::size_t sum = kMarkColumns;
         for (std::size_t i = kState; i < columns.size(); ++i) {
-            sum += columns.at(i).width() + gapbefore(i).size();
+            sum += columns.at(i).width + gapbefore(i).size();
         }
         return sum;
     }
 
-    [[nodiscard]] std::size_t namewidth() const { return columns[kName].width(); }
+    [[nodiscard]] std::size_t namewidth() const { return columns[kName].width; }
 
     void cutnames(std::size_t most)
     {
-        for (std::string& name : columns[kName].cells) {
-            name = fitted(name, most);
+        longestname = most;
+        column& names = columns[kName];
+        if (names.width <= most) {
+            return;
+        }
+        names.width = columnsof(names.header);
+        for (serviceid service = 0; service < seen.services; ++service) {
+            names.width = std::max(names.width, columnsof(fitted(seen.nameof(service), most)));
         }
     }
 
     void write(std::ostream& out, const rows& lines, bool colour) const
     {
-        std::array<std::size_t, kColumns> widths{};
-        std::transform(columns.begin(), columns.end(), widths.begin(),
-                       [](const column& each) { return each.width(); });
         std::string header = "  ";
         for (std::size_t i = 0; i < columns.size(); ++i) {
             header += gapbefore(i);
-            header += filled(i, std::string(columns.at(i).header), widths.at(i));
+            header += filled(i, std::string(columns.at(i).header));
         }
         out << tools::coloured(tools::kBold, header, colour) << '\n';
-        for (std::size_t line = 0; line < lines.size(); ++line) {
-            const look shown = lookof(lines[line]->now.what);
+        for (const serviceid service : lines) {
+            const account each = seen.accountof(service);
+            const cells line = cellsof(each);
+            const look shown = lookof(each.now.what);
             out << tools::coloured(shown.colour, std::string(1, shown.mark), colour) << ' ';
             for (std::size_t i = 0; i < columns.size(); ++i) {
                 out << gapbefore(i)
-                    << tools::coloured(shown.colour,
-                                       filled(i, columns.at(i).cells[line], widths.at(i)),
-                                       colour && i == kState);
+                    << tools::coloured(shown.colour, filled(i, line.at(i)), colour && i == kState);
             }
             out << '\n';
         }
     }
 
 private:
-    static constexpr std::size_t kColumns = kShare + 1;
     static constexpr std::size_t kMarkColumns = 2;
 
     static std::string_view gapbefore(std::size_t where) noexcept
@@ -240,27 +249,27 @@ private:
         return where == kName ? "" : where <= kLast ? "  " : " ";
     }
 
-    [[nodiscard]] std::string filled(std::size_t where, std::string text, std::size_t width) const
+    [[nodiscard]] std::string filled(std::size_t where, std::string text) const
     {
-        return columns.at(where).right ? filledbefore(std::move(text), width)
-                                       : filledbehind(std::move(text), width);
+        const column& all = columns.at(where);
+        return all.right ? filledbefore(std::move(text), all.width)
+                         : filledbehind(std::move(text), all.width);
     }
 
-    void add(const account& service)
+    [[nodiscard]] cells cellsof(const account& service) const
     {
-        const auto put = [this](place where, std::string text) {
-            columns.at(where).cells.push_back(std::move(text));
-        };
         const state now = service.now.what;
-        put(kName, fitted(service.name, std::string::npos));
-        put(kState, std::string(how.fullwords ? wordof(now) : lookof(now).shortword));
-        put(kSince, (service.now.inferred ? '~' : ' ') + timetext(service.now.from));
-        put(kLast, lastoutage(service));
-        put(kOutages, shortcount(service.outages));
-        put(kRecoveries, fmt::format("{}/{}", shortcount(service.recoveriessuccessful),
-                                     shortcount(service.recoveriestried)));
-        put(kSkips, shortcount(service.skippedchecks));
-        put(kShare, availabilitytext(service));
+        cells line;
+        line[kName] = fitted(service.name, longestname);
+        line[kState] = how.fullwords ? wordof(now) : lookof(now).shortword;
+        line[kSince] = (service.now.inferred ? '~' : ' ') + timetext(service.now.from);
+        line[kLast] = lastoutage(service);
+        line[kOutages] = shortcount(service.outages);
+        line[kRecoveries] = fmt::format("{}/{}", shortcount(service.recoveriessuccessful),
+                                        shortcount(service.recoveriestried));
+        line[kSkips] = shortcount(service.skippedchecks);
+        line[kShare] = availabilitytext(service);
+        return line;
     }
 
     [[nodiscard]] std::string timetext(const instant& when) const
@@ -287,6 +296,7 @@ private:
 
     const overview& seen;
     room how;
+    std::size_t longestname = std::string::npos;
     std::array<column, kColumns> columns{{{"SERVICE"},
                                           {"STATE"},
                                           {" SINCE"},
@@ -299,14 +309,13 @@ private:
 
 void writetable(std::ostream& out, const overview& seen, std::size_t columns, bool colour)
 {
-    const rows lines = sorted(seen.services);
     for (const room& each : kRooms) {
-        table tried(seen, lines, each);
+        table tried(seen, each);
         const std::size_t rest = tried.widthwithoutnames();
         const bool last = &each == &kRooms.back();
         if (rest + tried.namewidth() <= columns || last) {
             tried.cutnames(std::max(kLeastNameColumns, columns - std::min(columns, rest)));
-            tried.write(out, lines, colour);
+            tried.write(out, sorted(seen), colour);
             return;
         }
     }
@@ -366,44 +375,57 @@ void writesources(std::ostream& out, const overview& seen)
     }
 }
 
-// "web, db and 3 more".
-std::string named(const std::vector<std::string>& names)
+// Whether any service is so.
+template <typename Isso>
+bool anyone(const overview& seen, Isso isso)
 {
-    constexpr std::size_t kMostNames = 3;
-    const auto shown = static_cast<std::ptrdiff_t>(std::min(names.size(), kMostNames));
-    std::string text = fmt::format("{}", fmt::join(names.begin(), names.begin() + shown, ", "));
-    return names.size() > kMostNames ? text + fmt::format(" and {} more", names.size() - kMostNames)
-                                     : text;
-}
-
-// The log ends within the retries of these services, which are over by now.
-std::vector<std::string> silentsincefailure(const overview& seen)
-{
-    constexpr std::size_t kNameColumns = 16;
-    std::vector<std::string> names;
-    for (const account& each : seen.services) {
-        const bool retrying =
-            each.now.what == state::kSuspect || each.now.what == state::kFunctionalFailure;
-        if (retrying && !seen.asofnow &&
-            secondsbetween(each.now.from, seen.present) > kSilenceSeconds) {
-            names.push_back(fitted(each.name, kNameColumns));
+    for (serviceid service = 0; service < seen.services; ++service) {
+        if (isso(seen.accountof(service))) {
+            return true;
         }
     }
-    return names;
+    return false;
+}
+
+// Names the services within whose retries the log ends, although these are over by now.
+void writesilent(std::ostream& out, const overview& seen)
+{
+    constexpr std::size_t kNameColumns = 16;
+    constexpr std::size_t kMostNames = 3;
+    std::vector<std::string> names;
+    std::size_t more = 0;
+    for (serviceid service = 0; service < seen.services; ++service) {
+        const account each = seen.accountof(service);
+        const bool retrying =
+            each.now.what == state::kSuspect || each.now.what == state::kFunctionalFailure;
+        if (!(retrying && !seen.asofnow &&
+              secondsbetween(each.now.from, seen.present) > kSilenceSeconds)) {
+            continue;
+        }
+        if (names.size() < kMostNames) {
+            names.push_back(fitted(each.name, kNameColumns));
+        } else {
+            ++more;
+        }
+    }
+    if (!names.empty()) {
+        out << fmt::format("no word since the failure: {}", fmt::join(names, ", "))
+            << (more > 0 ? fmt::format(" and {} more", more) : "")
+            << "\n  a retry that succeeds leaves no message; --now judges as of the present\n";
+    }
 }
 
 // No thread is left that would tell of anything; a refresh that is under way takes a moment.
-bool nothingwatched(const overview& seen) noexcept
+bool nothingwatched(const overview& seen)
 {
-    return !seen.services.empty() &&
-           std::all_of(seen.services.begin(), seen.services.end(), [&](const account& each) {
-               return each.now.what == state::kNotWatched &&
-                      secondsbetween(each.now.from, seen.present) > kRefreshSeconds;
+    return seen.services != 0 && !anyone(seen, [&](const account& each) {
+               return each.now.what != state::kNotWatched ||
+                      secondsbetween(each.now.from, seen.present) <= kRefreshSeconds;
            });
 }
 
 // Why there is nothing to be told of any service from now on.
-std::string_view standstill(const overview& seen) noexcept
+std::string_view standstill(const overview& seen)
 {
     if (seen.loadfailed) {
         return "the configuration could not be loaded: nothing is watched until a refresh can";
@@ -419,14 +441,10 @@ void writecautions(std::ostream& out, const overview& seen)
     const auto inferred = [](const account& each) {
         return each.now.inferred || (each.lastoutage && each.lastoutage->inferred);
     };
-    if (std::any_of(seen.services.begin(), seen.services.end(), inferred)) {
+    if (anyone(seen, inferred)) {
         out << "~ inferred: no message says so, or when\n";
     }
-    const std::vector<std::string> silent = silentsincefailure(seen);
-    if (!silent.empty()) {
-        out << "no word since the failure: " << named(silent)
-            << "\n  a retry that succeeds leaves no message; --now judges as of the present\n";
-    }
+    writesilent(out, seen);
 }
 
 } // namespace
@@ -436,7 +454,7 @@ void writestatus(std::ostream& out, const overview& seen, std::size_t columns, b
     if (const std::string_view why = standstill(seen); !why.empty()) {
         out << tools::coloured(tools::kRed, std::string(why), colour) << '\n';
     }
-    if (seen.services.empty()) {
+    if (seen.services == 0) {
         out << "no service is named in the log\n";
     } else {
         writetable(out, seen, columns, colour);
@@ -446,11 +464,10 @@ void writestatus(std::ostream& out, const overview& seen, std::size_t columns, b
     writecautions(out, seen);
 }
 
-int statusof(const overview& seen) noexcept
+int statusof(const overview& seen)
 {
-    const bool trouble = seen.services.empty() || !standstill(seen).empty() ||
-                         std::any_of(seen.services.begin(), seen.services.end(),
-                                     [](const account& each) { return istrouble(each.now.what); });
+    const bool trouble = seen.services == 0 || !standstill(seen).empty() ||
+                         anyone(seen, [](const account& each) { return istrouble(each.now.what); });
     return trouble ? 1 : 0;
 }
 

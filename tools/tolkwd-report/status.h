@@ -15,6 +15,6 @@ void writestatus(std::ostream& out, const overview& seen, std::size_t columns, b
 
 // The exit status: 1 where somebody should look at a service or nothing is watched for want of a
 // configuration or of any service, else 0.
-int statusof(const overview& seen) noexcept;
+int statusof(const overview& seen);
 
 } // namespace report

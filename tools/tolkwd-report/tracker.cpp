@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <array>
 #include <cstdlib>
+#include <deque>
 #include <utility>
 
 #include "generations.h"
@@ -21,6 +22,10 @@ constexpr std::int64_t kSilentDaemonSeconds = 600;
 
 // From the first line of a new daemon to its first announcement: a second, and the time to load.
 constexpr std::int64_t kStartSeconds = 60;
+
+// So many announcements wait for the lines that tell their paths; no daemon has as many threads
+// between the two.
+constexpr std::size_t kMostWaiting = 1000;
 
 // What a message is to the tracker, besides what it tells about the state of a service.
 enum class role : std::uint8_t {
@@ -187,6 +192,22 @@ std::string_view wordsof(inference why) noexcept
     }
 }
 
+std::string knownname(std::string_view text)
+{
+    constexpr std::size_t kLongestCharacterBytes = 4;
+    if (text.size() <= kLongestNameBytes) {
+        return std::string(text);
+    }
+    const auto goeson = [text](std::size_t place) {
+        return (static_cast<unsigned char>(text[place]) & 0xc0U) == 0x80;
+    };
+    std::size_t end = kLongestNameBytes;
+    while (goeson(end) && end + kLongestCharacterBytes > kLongestNameBytes + 1) {
+        --end;
+    }
+    return std::string(text.substr(0, end)) + "...";
+}
+
 std::optional<double> account::availability() const noexcept
 {
     if (watchedseconds <= 0) {
@@ -202,20 +223,31 @@ public:
 
     void hear(const message& said);
     void conclude(const instant& when, bool final);
+    [[nodiscard]] serviceid count() const noexcept;
+    [[nodiscard]] std::string_view nameof(serviceid service) const { return who.nameof(service); }
+    [[nodiscard]] account accountof(serviceid service) const;
 
-    std::vector<account> accounts;
     bool loadfailed = false;
 
 private:
-    struct watched {
+    // What was heard of a service.
+    struct past {
+        explicit past(const servicestate& before) : course(before) {}
+
         servicestate course;
-        std::uint32_t announcedin = 0;  // the generation in which it was announced last
-        std::uint32_t monitors = 0;     // how often it was, in that
+        std::uint32_t monitors = 0;     // how often it was announced in its last generation
         std::uint64_t failing = 0;      // the thread that told of the last failure; 0: none yet
         std::vector<std::uint64_t> due; // threads whose functional recovery has its stops and
                                         // starts to come
-        std::uint32_t seen = 0;         // the generation in which it was heard of last
-        bool pathexpected = true;       // its path, if one is known, is of a former generation
+    };
+
+    struct watched {
+        instant announced;             // the first announcement
+        std::uint32_t announcedin = 0; // the generation in which it was announced last; 0: never
+        std::uint32_t seen = 0;        // the generation in which it was heard of last
+        bool pathexpected = true;      // its path, if one is known, is of a former generation
+        bool isactive = false;         // is in `active`
+        std::unique_ptr<past> heard;   // null while that is one announcement at most
     };
 
     // An announcement that may belong to a service of which the path is known already: the next
@@ -239,8 +271,8 @@ private:
     void nothingloaded(const message& said);
     void daemonended(const message& said);
     void statetold(const std::optional<serviceid>& service, const message& said);
-    static bool continuesrecovery(watched& one, const message& said);
-    static servicestate::speaker speakerof(watched& one, const message& said);
+    static bool continuesrecovery(past& one, const message& said);
+    static servicestate::speaker speakerof(past& one, const message& said);
 
     [[nodiscard]] std::optional<serviceid> speaker(std::uint64_t thread) const noexcept;
     std::optional<serviceid> named(std::uint64_t thread, std::string_view name, bool whole);
@@ -250,12 +282,18 @@ private:
     void setpath(serviceid service, std::string_view path);
     serviceid add(std::string_view name);
     serviceid addnameless(std::string_view path);
+    std::string_view shortened(std::string_view text);
+    [[nodiscard]] servicestate courseof(const watched& one) const;
+    past& pastof(watched& one);
+    void activate(serviceid service);
+    template <typename Stays>
+    void sift(Stays stays);
 
     void unwatch(serviceid service, const instant& when, bool inferred, inference why);
     void unwatchall(const instant& when, bool inferred, inference why);
     void unwatchsilent();
     void leaveout();
-    void conclude(serviceid service, const instant& when, bool final);
+    [[nodiscard]] servicestate concluded(serviceid service, turns& into) const;
 
     void tellturns(serviceid service);
     void tell(const std::optional<serviceid>& service, const message& said, eventkind kind);
@@ -264,7 +302,8 @@ private:
     witness listens;
     generations generation;
     roster who;
-    std::vector<watched> services;
+    std::deque<watched> services;  // growing moves none of them
+    std::vector<serviceid> active; // all others are not watched
     std::vector<announcement> waiting;
     turns told;           // of the message that is being heard
     bool complete = true; // whom the generation leaves out is known
@@ -272,6 +311,9 @@ private:
     instant last;         // the message that is being heard, or was
     instant silentfrom;   // the last long pause of all threads
     instant silentto;
+    std::optional<instant> clockchange; // the last one
+    instant judged;                     // see conclude
+    std::string longname;               // see shortened
 };
 
 void tracker::work::hear(const message& said)
@@ -293,11 +335,11 @@ void tracker::work::hear(const message& said)
     case role::kLeaves:
         return threadleft(said);
     case role::kNames:
-        return statetold(named(said.thread, firstline(said.first), true), said);
+        return statetold(named(said.thread, shortened(firstline(said.first)), true), said);
     case role::kEndsNamed:
-        return statetold(named(said.thread, said.first, false), said);
+        return statetold(named(said.thread, shortened(said.first), false), said);
     case role::kPath:
-        return statetold(pathed(said.thread, firstline(said.first)), said);
+        return statetold(pathed(said.thread, shortened(firstline(said.first))), said);
     case role::kCommand:
         return tell(commanded(said.thread, said.first), said, kindof(said.id));
     case role::kNoLoad:
@@ -316,10 +358,30 @@ void tracker::work::conclude(const instant& when, bool final)
     if (final) {
         watchwaiting(nullptr);
     }
-    const instant end = started && secondsbetween(last, when) < 0 ? last : when;
-    for (serviceid service = 0; service < services.size(); ++service) {
-        conclude(service, end, final);
+    judged = started && secondsbetween(last, when) < 0 ? last : when;
+    if (!final || (!listens.happened && !listens.ended)) {
+        return;
     }
+    for (serviceid service = 0; service < services.size(); ++service) {
+        told.clear();
+        (void)concluded(service, told);
+        tellturns(service);
+    }
+}
+
+serviceid tracker::work::count() const noexcept
+{
+    return static_cast<serviceid>(services.size());
+}
+
+account tracker::work::accountof(serviceid service) const
+{
+    turns ignored;
+    account result;
+    result.name = who.nameof(service);
+    result.path = who.pathof(service);
+    concluded(service, ignored).fill(result);
+    return result;
 }
 
 // The order of the log is the order of time, whatever a line's own stamp says.
@@ -347,25 +409,28 @@ void tracker::work::noteclock(const instant& before)
         silentto = last;
     }
     if (std::abs(last.clock - before.clock - passed) > kClockChangeSeconds) {
-        for (watched& each : services) {
-            each.course.changeclock(last);
-        }
+        clockchange = last;
         tellofall(eventkind::kDaemon, inference::kClockChanged);
     }
 }
 
 void tracker::work::announced(const message& said)
 {
-    const std::optional<serviceid> known = who.byname(said.first);
+    const std::string_view name = shortened(said.first);
+    const std::optional<serviceid> known = who.byname(name);
     const auto* const tie = who.bythread(said.thread);
     const bool threadagain = tie != nullptr && tie->generation == generation.number();
     const bool serviceagain = known && services[*known].seen == generation.number();
     begingeneration(generation.announced(last, threadagain, serviceagain, !services.empty()));
     if (!known && who.hasnameless()) {
-        waiting.push_back({said.thread, std::string(said.first), last});
+        if (waiting.size() == kMostWaiting) {
+            (void)watchwaiting(waiting.front(), nullptr);
+            waiting.erase(waiting.begin());
+        }
+        waiting.push_back({said.thread, std::string(name), last});
         return tell(std::nullopt, said, eventkind::kWatched);
     }
-    const serviceid service = known ? *known : add(said.first);
+    const serviceid service = known ? *known : add(name);
     watch(service, said.thread, last);
     tellturns(service);
     tell(service, said, eventkind::kWatched);
@@ -391,14 +456,24 @@ void tracker::work::begingeneration(generations::start how)
 void tracker::work::watch(serviceid service, std::uint64_t thread, const instant& when)
 {
     tied(thread, service);
+    activate(service);
     watched& one = services[service];
     one.pathexpected = true;
-    one.monitors = one.announcedin == generation.number() ? one.monitors + 1 : 1;
+    if (one.announcedin == 0 && !one.heard) {
+        one.announced = when;
+        one.announcedin = generation.number();
+        servicestate(clockchange)
+            .hear(messageid::kServiceNamed, when, generation.hassteps(),
+                  servicestate::speaker::kOwn, told);
+        return;
+    }
+    past& heard = pastof(one);
+    heard.monitors = one.announcedin == generation.number() ? heard.monitors + 1 : 1;
     one.announcedin = generation.number();
-    one.failing = 0;
-    one.due.clear();
-    one.course.hear(messageid::kServiceNamed, when, generation.hassteps(),
-                    servicestate::speaker::kOwn, told);
+    heard.failing = 0;
+    heard.due.clear();
+    heard.course.hear(messageid::kServiceNamed, when, generation.hassteps(),
+                      servicestate::speaker::kOwn, told);
 }
 
 // `said`: the next message of whatever thread; null at the end.
@@ -416,12 +491,11 @@ bool tracker::work::watchwaiting(const announcement& due, const message* said)
     }
     std::optional<serviceid> service = who.byname(due.name); // announced twice
     if (!service && isown && said->id == messageid::kBinaryPathNamed) {
-        service = who.bypath(said->first);
+        service = who.bypath(shortened(said->first));
         if (service && !who.isnameless(*service)) {
             service.reset();
         } else if (service) {
             who.name(*service, due.name);
-            accounts[*service].name = due.name;
         }
     }
     if (!service) {
@@ -439,10 +513,11 @@ bool tracker::work::watchwaiting(const announcement& due, const message* said)
 void tracker::work::pathnamed(const message& said)
 {
     std::optional<serviceid> service = speaker(said.thread);
+    const std::string_view path = shortened(said.first);
     if (service && services[*service].pathexpected) {
-        setpath(*service, said.first);
-    } else if (who.bypath(said.first)) { // the line with the name is lost
-        service = pathed(said.thread, said.first);
+        setpath(*service, path);
+    } else if (who.bypath(path)) { // the line with the name is lost
+        service = pathed(said.thread, path);
     }
     tell(service, said, kindof(said.id));
 }
@@ -453,8 +528,8 @@ void tracker::work::threadleft(const message& said)
     const std::optional<serviceid> service = speaker(said.thread);
     who.untie(said.thread);
     if (service && who.watchers(*service, generation.number()) == 0) {
-        services[*service].course.hear(said.id, last, generation.hassteps(),
-                                       servicestate::speaker::kOwn, told);
+        pastof(services[*service])
+            .course.hear(said.id, last, generation.hassteps(), servicestate::speaker::kOwn, told);
         tellturns(*service);
     }
     tell(service, said, kindof(said.id));
@@ -479,8 +554,9 @@ void tracker::work::statetold(const std::optional<serviceid>& service, const mes
 {
     bool again = false;
     if (service && servicestate::tells(said.id)) {
-        watched& one = services[*service];
-        one.seen = generation.number();
+        services[*service].seen = generation.number();
+        activate(*service);
+        past& one = pastof(services[*service]);
         again = continuesrecovery(one, said);
         if (!again) {
             one.course.hear(said.id, last, generation.hassteps(), speakerof(one, said), told);
@@ -492,7 +568,7 @@ void tracker::work::statetold(const std::optional<serviceid>& service, const mes
 
 // The functional recovery names its general part, too: that is no recovery of its own. Between the
 // two its thread says nothing else, but other threads may.
-bool tracker::work::continuesrecovery(watched& one, const message& said)
+bool tracker::work::continuesrecovery(past& one, const message& said)
 {
     constexpr std::size_t kMostDue = 4; // a part that is lost is waited for no longer than that
     const bool wasdue = std::erase(one.due, said.thread) != 0;
@@ -505,7 +581,7 @@ bool tracker::work::continuesrecovery(watched& one, const message& said)
     return wasdue && said.id == messageid::kRecoveryTried;
 }
 
-servicestate::speaker tracker::work::speakerof(watched& one, const message& said)
+servicestate::speaker tracker::work::speakerof(past& one, const message& said)
 {
     switch (said.id) {
     case messageid::kServiceFailed:
@@ -535,7 +611,7 @@ std::optional<serviceid> tracker::work::named(std::uint64_t thread, std::string_
 {
     const std::optional<serviceid> before = speaker(thread);
     const bool isnameless = before && who.isnameless(*before);
-    if (before && !isnameless && accounts[*before].name == name) {
+    if (before && !isnameless && who.nameof(*before) == name) {
         return tied(thread, *before);
     }
     if (const std::optional<serviceid> known = who.byname(name)) {
@@ -546,7 +622,6 @@ std::optional<serviceid> tracker::work::named(std::uint64_t thread, std::string_
     }
     if (isnameless) {
         who.name(*before, name);
-        accounts[*before].name = name;
         return tied(thread, *before);
     }
     return tied(thread, before && !whole ? *before : add(name));
@@ -555,7 +630,7 @@ std::optional<serviceid> tracker::work::named(std::uint64_t thread, std::string_
 std::optional<serviceid> tracker::work::commanded(std::uint64_t thread, std::string_view command)
 {
     const std::optional<std::string_view> name = nameincommand(command);
-    return name ? named(thread, firstline(*name), true) : speaker(thread);
+    return name ? named(thread, shortened(firstline(*name)), true) : speaker(thread);
 }
 
 // Another path than that of the thread's service tells the same. A path that nobody is known to
@@ -592,77 +667,126 @@ serviceid tracker::work::tied(std::uint64_t thread, serviceid service)
 void tracker::work::setpath(serviceid service, std::string_view path)
 {
     who.setpath(service, path);
-    accounts[service].path = path;
     services[service].pathexpected = false;
 }
 
 serviceid tracker::work::add(std::string_view name)
 {
     services.emplace_back();
-    accounts.emplace_back().name = name;
     return who.add(name);
 }
 
 serviceid tracker::work::addnameless(std::string_view path)
 {
     services.emplace_back().pathexpected = false;
-    accounts.emplace_back().name.append("(").append(path).append(")");
-    accounts.back().path = path;
-    return who.addnameless(path);
+    return who.addnameless(std::string("(").append(path).append(")"), path);
 }
 
 void tracker::work::unwatch(serviceid service, const instant& when, bool inferred, inference why)
 {
     told.clear();
-    services[service].course.unwatch(when, inferred, why, generation.hassteps(), told);
+    pastof(services[service]).course.unwatch(when, inferred, why, generation.hassteps(), told);
     tellturns(service);
     told.clear();
 }
 
 void tracker::work::unwatchall(const instant& when, bool inferred, inference why)
 {
-    for (serviceid service = 0; service < services.size(); ++service) {
+    sift([&](serviceid service) {
         unwatch(service, when, inferred, why);
-    }
+        return false;
+    });
 }
 
 // The daemon had ended when all fell silent. A service without a thread had been silent before, and
 // what became of it does not depend on the daemon.
 void tracker::work::unwatchsilent()
 {
-    for (serviceid service = 0; service < services.size(); ++service) {
-        const state before = services[service].course.current();
-        if (before != state::kGaveUp && before != state::kUnknownService) {
+    sift([&](serviceid service) {
+        const state before = pastof(services[service]).course.current();
+        const bool stays = before == state::kGaveUp || before == state::kUnknownService;
+        if (!stays) {
             unwatch(service, silentfrom, true, inference::kDaemonEnded);
         }
-    }
+        return stays;
+    });
 }
 
 // All that are configured have been announced, at about the same time.
 void tracker::work::leaveout()
 {
     complete = true;
-    for (serviceid service = 0; service < services.size(); ++service) {
-        if (services[service].seen != generation.number()) {
+    sift([&](serviceid service) {
+        const bool stays = services[service].seen == generation.number();
+        if (!stays) {
             unwatch(service, generation.since(), true, inference::kLeftOut);
         }
+        return stays;
+    });
+}
+
+// Valid until the next text that is too long.
+std::string_view tracker::work::shortened(std::string_view text)
+{
+    if (text.size() <= kLongestNameBytes) {
+        return text;
+    }
+    longname = knownname(text);
+    return longname;
+}
+
+servicestate tracker::work::courseof(const watched& one) const
+{
+    if (one.heard) {
+        return one.heard->course;
+    }
+    servicestate course(clockchange);
+    if (one.announcedin != 0) {
+        turns toldbefore;
+        course.hear(messageid::kServiceNamed, one.announced, generation.hassteps(),
+                    servicestate::speaker::kOwn, toldbefore);
+    }
+    return course;
+}
+
+tracker::work::past& tracker::work::pastof(watched& one)
+{
+    if (!one.heard) {
+        one.heard = std::make_unique<past>(courseof(one));
+        one.heard->monitors = one.announcedin == 0 ? 0 : 1;
+    }
+    return *one.heard;
+}
+
+void tracker::work::activate(serviceid service)
+{
+    if (!std::exchange(services[service].isactive, true)) {
+        active.push_back(service);
     }
 }
 
-// On a copy, unless it is final: what is to come may tell something else.
-void tracker::work::conclude(serviceid service, const instant& when, bool final)
+// Asks of each active service whether it stays so.
+template <typename Stays>
+void tracker::work::sift(Stays stays)
 {
-    told.clear();
-    servicestate course = services[service].course;
+    std::sort(active.begin(), active.end());
+    std::erase_if(active, [&](serviceid service) {
+        services[service].isactive = stays(service);
+        return !services[service].isactive;
+    });
+}
+
+// A copy: what is to come may tell something else.
+servicestate tracker::work::concluded(serviceid service, turns& into) const
+{
+    const watched& one = services[service];
+    servicestate course = courseof(one);
     const bool steps = generation.hassteps();
-    if (!complete && services[service].seen != generation.number()) {
-        course.unwatch(generation.since(), true, inference::kLeftOut, steps, told);
+    if (!complete && one.seen != generation.number()) {
+        course.unwatch(generation.since(), true, inference::kLeftOut, steps, into);
     }
-    course.conclude(when, steps, told);
-    course.fill(accounts[service]);
-    if (final) {
-        tellturns(service);
-    }
+    course.conclude(judged, steps, into);
+    return course;
 }
 
 // The spans that have ended, and the states that have begun without a message.
@@ -726,9 +850,19 @@ void tracker::conclude(const instant& when, bool final)
     self->conclude(when, final);
 }
 
-const std::vector<account>& tracker::accounts() const noexcept
+serviceid tracker::services() const noexcept
 {
-    return self->accounts;
+    return self->count();
+}
+
+std::string_view tracker::nameof(serviceid service) const
+{
+    return self->nameof(service);
+}
+
+account tracker::accountof(serviceid service) const
+{
+    return self->accountof(service);
 }
 
 bool tracker::loadfailed() const noexcept

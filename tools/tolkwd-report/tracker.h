@@ -12,13 +12,13 @@
 // Whatever begins by such a rule is marked as inferred.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <functional>
 #include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
-#include <vector>
 
 #include "message.h"
 #include "state.h"
@@ -43,9 +43,16 @@ struct outage {
     bool inferred = false;       // no message says that it ended, or when
 };
 
+// Names and paths of more than so many bytes are known by their beginning.
+inline constexpr std::size_t kLongestNameBytes = 4096;
+
+// The name or path by which `text` is known: itself, or its first kLongestNameBytes and "...". No
+// character of UTF-8 is cut in two. Any thread.
+std::string knownname(std::string_view text);
+
 // All that is known of one service, in constant memory. Times in seconds.
 struct account {
-    std::string name; // as the log has it; may hold anything
+    std::string name; // as the log has it, see knownname; may hold anything
     std::string path; // its binarypath; empty where the log does not tell
     span now;         // the state it is in, up to the last message of the log
     std::optional<outage> lastoutage;
@@ -133,12 +140,16 @@ public:
     // What is known at `when`, which is not before the last message: draws the conclusions that
     // silence up to then allows, and brings the open spans and all figures up to date. May be
     // called again, and hear() after it; conclusions that a later message refutes are taken back.
-    // `final`: also ends the open spans for the witness; nothing may be called then but accounts().
+    // `final`: also ends the open spans for the witness; nothing is heard after it.
     void conclude(const instant& when, bool final);
 
-    // All services, in the order in which the log names them; valid until the next call. Up to date
-    // after conclude().
-    [[nodiscard]] const std::vector<account>& accounts() const noexcept;
+    // How many services there are, in the order in which the log names them.
+    [[nodiscard]] serviceid services() const noexcept;
+
+    // A service's name, valid until the next message, and all that is known of it, as of the last
+    // conclude().
+    [[nodiscard]] std::string_view nameof(serviceid service) const;
+    [[nodiscard]] account accountof(serviceid service) const;
 
     // Whether the last load of the configuration failed, so that nothing is watched.
     [[nodiscard]] bool loadfailed() const noexcept;

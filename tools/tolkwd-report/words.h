@@ -2,9 +2,9 @@
 #pragma once
 
 #include <cstdint>
+#include <deque>
 #include <optional>
 #include <string>
-#include <vector>
 
 #include "tracker.h"
 
@@ -36,8 +36,8 @@ public:
 private:
     tale& taleof(const event& what);
 
-    std::vector<tale> tales; // by service
-    tale nobody;             // of events that belong to no service
+    std::deque<tale> tales; // by service
+    tale nobody;            // of events that belong to no service
 };
 
 } // namespace report
