@@ -322,7 +322,7 @@ def write_table(path, results):
     if git("status", "--porcelain"):
         state += " with local changes"
     lines = [f"{datetime.date.today().isoformat()}, {state}", "",
-             "| name | breaks | caught by |", "|---|---|---|"]
+             "| mutant | the promise it breaks | caught by |", "|---|---|---|"]
     for mutant, caught in results:
         lines.append(f"| {mutant['name']} | {mutant['breaks']} | {caught or '**survived**'} |")
     pathlib.Path(path).write_text("\n".join(lines) + "\n")
