@@ -302,6 +302,7 @@ def try_mutants(mutants, full):
     with tempfile.TemporaryDirectory(prefix="tolkwd-mutation-",
                                      ignore_cleanup_errors=True) as name:
         folder = pathlib.Path(name)
+        folder.chmod(0o755)  # tests look at whether other users reach their folders
         prepare(folder, all_kinds(mutants))
         for mutant in mutants:
             try:
