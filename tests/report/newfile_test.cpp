@@ -119,6 +119,28 @@ protected:
     }
 };
 
+constexpr const char* kAccessList = "system.posix_acl_access";
+
+// Sets an access control list: read and write for the owner, nothing for the group, and these
+// rights for a user and for others. False where the file system has none.
+bool setlist(const fs::path& path, const char* attribute, std::uint16_t user, std::uint16_t mask,
+             std::uint16_t others)
+{
+    struct entry {
+        std::uint16_t tag, rights;
+        std::uint32_t id;
+    };
+    const struct {
+        std::uint32_t version = 2;
+        std::array<entry, 5> entries;
+    } list{.entries = {{{0x01, 6, ~0U}, // owner, a user, group, mask, others
+                        {0x02, user, kSomebody},
+                        {0x04, 0, ~0U},
+                        {0x10, mask, ~0U},
+                        {0x20, others, ~0U}}}};
+    return setxattr(path.c_str(), attribute, &list, sizeof list, 0) == 0;
+}
+
 void writepage(std::ostream& out)
 {
     out << "a page";
@@ -225,7 +247,7 @@ TEST_F(NewFile, RefusesLinksThatLeadNowhere)
               (folder / "one").native() + ": Too many levels of symbolic links");
     EXPECT_EQ(refusal(folder / "root"), (folder / "root").native() + ": Is a directory");
     EXPECT_EQ(refusal(file + "/page"), file + "/page: Not a directory");
-    EXPECT_EQ(refusal(folder / "new/"), (folder / "new/").native() + ": No such file or directory");
+    EXPECT_EQ(refusal(folder / "new/"), (folder / "new/").native() + ": Is a directory");
     EXPECT_EQ(refusal("."), ".: Is a directory");
     EXPECT_EQ(refusal(""), ": No such file or directory");
 }
@@ -322,27 +344,17 @@ TEST_F(NewFile, IsOpenedOnce)
 }
 
 // Who may read a file may be said by an access control list: then its mode means something else.
-TEST_F(NewFile, WithoutTheOldAccessControlListGivesNobodyMore)
+TEST_F(NewFile, WithoutTheOldAccessControlListIsItsOwnersAlone)
 {
-    const fs::path page = made("page", "an old page", 0600);
-    struct entry {
-        std::uint16_t tag, rights;
-        std::uint32_t id;
-    };
-    struct {
-        std::uint32_t version = 2;
-        std::array<entry, 5> entries{{{0x01, 6, ~0U}, // owner, a user, group, mask, others
-                                      {0x02, 6, kSomebody},
-                                      {0x04, 0, ~0U},
-                                      {0x10, 6, ~0U},
-                                      {0x20, 0, ~0U}}};
-    } list;
-    if (setxattr(page.c_str(), "system.posix_acl_access", &list, sizeof list, 0) != 0) {
-        GTEST_SKIP() << "no access control lists in " << folder;
+    for (const std::uint16_t rights :
+         std::array<std::uint16_t, 2>{6, 0}) { // the list gives or denies somebody something
+        const fs::path page = made("page", "an old page", 0644);
+        if (!setlist(page, kAccessList, rights, 4, 4)) {
+            GTEST_SKIP() << "no access control lists in " << folder;
+        }
+        writewhole(page, {}, writepage);
+        EXPECT_EQ(modeof(page), 0600U);
     }
-    ASSERT_EQ(modeof(page), 0660U);
-    writewhole(page, {}, writepage);
-    EXPECT_EQ(modeof(page), 0600U);
 }
 
 TEST_F(NewFileAsRoot, KeepsOwnerAndGroupOfTheOldOne)
@@ -394,14 +406,38 @@ TEST_F(NewFileAsRoot, IsNotWhereALinkOfAnotherUserLeads)
     fs::create_symlink(page, folder / "theirs");
     fs::create_symlink("theirs", folder / "chain");
     fs::create_symlink("missing", folder / "dangling");
-    for (const char* const link : {"theirs", "dangling"}) {
+    fs::create_directory_symlink("real", folder / "way");
+    fs::create_directory_symlink("way", folder / "detour");
+    for (const char* const link : {"theirs", "dangling", "way"}) {
         ASSERT_EQ(lchown((folder / link).c_str(), kSomebody, kSomebody), 0);
     }
-    for (const char* const name : {"theirs", "chain", "dangling"}) {
+    for (const char* const name : {"theirs", "chain", "dangling", "way/page", "detour/page"}) {
         const fs::path path = folder / name;
         EXPECT_EQ(refusal(path), path.native() + ": a symbolic link of another user");
     }
     EXPECT_EQ(textof(page), "an old page");
+}
+
+TEST_F(NewFileAsRoot, IsNoneOfAnotherUserInASharedFolder)
+{
+    const fs::path page = made("page", "an old page");
+    ASSERT_EQ(chown(page.c_str(), kSomebody, kSomebody), 0);
+    ASSERT_EQ(chmod(folder.c_str(), 01777), 0);
+    EXPECT_EQ(refusal(page), page.native() + ": a file of another user in a shared folder");
+    ASSERT_EQ(chown(folder.c_str(), kSomebody, kSomebody), 0);
+    EXPECT_EQ(refusal(page), "");
+    EXPECT_EQ(factsof(page).st_uid, kSomebody);
+}
+
+TEST_F(NewFileAsRoot, TakesNoAccessControlListOfItsFolder)
+{
+    const fs::path page = made("page", "an old page", 0640);
+    if (!setlist(folder, "system.posix_acl_default", 6, 5, 5)) {
+        GTEST_SKIP() << "no access control lists in " << folder;
+    }
+    writewhole(page, {}, writepage);
+    EXPECT_LT(getxattr(page.c_str(), kAccessList, nullptr, 0), 0);
+    EXPECT_EQ(modeof(page), 0640U);
 }
 
 TEST_F(NewFileAsRoot, MayBeWhereALinkLeadsForOthers)

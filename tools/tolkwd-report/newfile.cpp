@@ -25,6 +25,8 @@ namespace {
 
 namespace fs = std::filesystem;
 
+constexpr const char* kAccessList = "system.posix_acl_access"; // an attribute
+
 [[noreturn]] void fail(int reason, const std::string& name)
 {
     throw std::system_error(reason, std::generic_category(), name);
@@ -45,29 +47,53 @@ struct place {
     descriptor file{};  // what is there, if anything; not open for reading or writing
 };
 
-std::string linktext(const place& link, const std::string& name)
+// Root does not follow other users' links: they may lead to any file of the system.
+void checklink(const struct stat& link, const std::string& name)
+{
+    if (geteuid() == 0 && link.st_uid != 0) {
+        throw std::runtime_error(name + ": a symbolic link of another user");
+    }
+}
+
+std::string linktext(int folder, const std::string& link, const std::string& name)
 {
     std::array<char, PATH_MAX> text{};
-    const ssize_t size =
-        readlinkat(link.folder.number(), link.name.c_str(), text.data(), text.size());
+    const ssize_t size = readlinkat(folder, link.c_str(), text.data(), text.size());
     if (size < 0) {
         fail(errno, name);
     }
     return {text.data(), static_cast<std::size_t>(size)};
 }
 
+// The folder `path`, which may be relative to the folder `from`.
+descriptor folderat(const fs::path& path, int from, const std::string& name, int links = 0)
+{
+    constexpr int kMostLinks = 40; // as the system's own
+    descriptor folder(openat(from, path.is_absolute() ? "/" : ".", O_PATH | O_CLOEXEC));
+    for (const fs::path& part : path.relative_path()) {
+        if (part.empty()) { // behind a slash at the end
+            continue;
+        }
+        descriptor next(openat(folder.number(), part.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC));
+        if (next.number() < 0 || links > kMostLinks) {
+            fail(next.number() < 0 ? errno : ELOOP, name);
+        }
+        if (const struct stat facts = factsof(next, name); S_ISLNK(facts.st_mode)) {
+            checklink(facts, name);
+            next = folderat(linktext(folder.number(), part, name), folder.number(), name, ++links);
+        }
+        folder = std::move(next);
+    }
+    return folder;
+}
+
 // What is at `path`, which may be relative to the folder `from`.
 place placeof(const fs::path& path, int from, const std::string& name)
 {
-    const fs::path folder = path.has_parent_path() ? path.parent_path() : ".";
-    place found{descriptor(openat(from, folder.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC)),
-                path.filename()};
-    if (found.folder.number() < 0) {
-        fail(errno, name);
-    }
-    if (found.name.empty()) {
+    if (path.filename().empty()) {
         fail(path.empty() ? ENOENT : EISDIR, name);
     }
+    place found{folderat(path.parent_path(), from, name), path.filename()};
     found.file = descriptor(
         openat(found.folder.number(), found.name.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC));
     if (found.file.number() < 0 && errno != ENOENT) {
@@ -76,8 +102,7 @@ place placeof(const fs::path& path, int from, const std::string& name)
     return found;
 }
 
-// Where the file is, whose folder is held open. A symbolic link in its place is followed, but not
-// another user's by root: it may lead to any file of the system.
+// Where the file is, whose folder is held open. Symbolic links are followed, one after the other.
 place resolved(const std::string& name)
 {
     place found = placeof(name, AT_FDCWD, name);
@@ -86,15 +111,13 @@ place resolved(const std::string& name)
         if (!S_ISLNK(facts.st_mode)) {
             break;
         }
-        if (geteuid() == 0 && facts.st_uid != 0) {
-            throw std::runtime_error(name + ": a symbolic link of another user");
-        }
+        checklink(facts, name);
         const int folder = found.folder.number();
         descriptor target(openat(folder, found.name.c_str(), O_PATH | O_CLOEXEC));
         if (target.number() < 0 && errno != ENOENT) {
             fail(errno, name);
         }
-        place next = placeof(linktext(found, name), folder, name);
+        place next = placeof(linktext(folder, found.name, name), folder, name);
         if (next.file.number() < 0 && target.number() >= 0) { // a pipe behind /dev/stdout
             found.file = std::move(target);
             break;
@@ -102,6 +125,16 @@ place resolved(const std::string& name)
         found = std::move(next);
     }
     return found;
+}
+
+// In a folder such as /tmp another user may have made the file, to own what root writes to it.
+void checkowner(const place& found, const struct stat& file, const std::string& name)
+{
+    const struct stat folder = factsof(found.folder, name);
+    const bool isshared = (folder.st_mode & S_ISVTX) != 0 && (folder.st_mode & 022U) != 0;
+    if (geteuid() == 0 && isshared && file.st_uid != 0 && file.st_uid != folder.st_uid) {
+        throw std::runtime_error(name + ": a file of another user in a shared folder");
+    }
 }
 
 // A stream does not report why it failed; errno mostly holds the reason.
@@ -142,14 +175,16 @@ mode_t usualmode()
     return 0666U & ~mask;
 }
 
-// The mode of a file that replaces an old one. No user gains a right: where the group changes, or
-// an access control list is lost, group and others get what both had.
+// The mode of a file that replaces an old one. No user gains a right: where the group changes,
+// group and others get what both had; where an access control list is lost, they get nothing.
 mode_t modelike(const descriptor& old, const struct stat& facts, bool samegroup)
 {
     const mode_t mode = facts.st_mode & 0777U;
+    if (getxattr(pathof(old).c_str(), kAccessList, nullptr, 0) > 0) {
+        return mode & 0700U;
+    }
     const mode_t both = (mode >> 3U) & mode & 07U; // its group and others
-    const bool haslist = getxattr(pathof(old).c_str(), "system.posix_acl_access", nullptr, 0) > 0;
-    return samegroup && !haslist ? mode : (mode & 0700U) | both << 3U | both;
+    return samegroup ? mode : (mode & 0700U) | both << 3U | both;
 }
 
 // A new file beside another, readable by its owner only. Deleted at the end unless renamed.
@@ -190,6 +225,7 @@ public:
             return;
         }
         const struct stat old = factsof(at.file, asked);
+        (void)fremovexattr(file.number(), kAccessList); // the folder may have given one
         const bool samegroup = fchown(file.number(), static_cast<uid_t>(-1), old.st_gid) == 0;
         setmode(modelike(at.file, old, samegroup));
         (void)!fchown(file.number(), old.st_uid, static_cast<gid_t>(-1));
@@ -244,6 +280,7 @@ void writewhole(const std::string& name, const std::vector<std::string>& inputs,
     if (found.file.number() >= 0) {
         facts = factsof(found.file, name);
         refuseinput(facts, inputs, name);
+        checkowner(found, facts, name);
         if (!S_ISREG(facts.st_mode)) {
             writeto(found.file, name, write);
             return;
