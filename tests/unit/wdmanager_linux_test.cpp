@@ -252,6 +252,21 @@ TEST_F(Manager, RefreshconfigForgetsAndLoadsAgain)
     EXPECT_TRUE(xmlparser::alltargets.empty());
 }
 
+TEST_F(Manager, RefreshconfigThatCannotLoadLeavesNothingToWatch)
+{
+    wdmanager manager(folder.path("config.xml"), folder.path("log"));
+    folder.write("config.xml", "<wdtargets><stopcmd/></wdtargets>");
+    manager.refreshconfig();
+    world.onsleep = [ticks = 0](unsigned) mutable {
+        if (++ticks == 2) {
+            throw StopHere();
+        }
+    };
+    EXPECT_THROW(manager.wdstart(), StopHere);
+    EXPECT_EQ(withoutlisting(world.events()),
+              lines({"ERROR Loadservices error.", "sleep 1", "make lock", "sleep 1"}));
+}
+
 TEST_F(Manager, LockThatCannotBeMadeEndsTheMainThreadBeforeAnyOther)
 {
     world.lockinitresult = EAGAIN;
