@@ -323,7 +323,7 @@ def test_an_interrupt_that_the_command_gets_first_runs_nothing_more(sandbox):
         "until [ -s /opt/stage/calls ]; do sleep 0.05; done\n"
         "kill -STOP $!; kill -INT -- -$!\n"
         "for i in 1 2 3 4 5; do grep -q mail /opt/stage/calls && break; sleep 0.1; done\n"
-        "kill -CONT $!; wait $!")
+        "kill -CONT $!; wait -f $!")  # -f: not only until it stops
     played = subprocess.run(command, capture_output=True, timeout=LIMIT_SECONDS,
                             preexec_fn=lambda: signal.signal(signal.SIGINT, signal.SIG_DFL))
     assert b"tolkwd-check: interrupted\n" in played.stderr
