@@ -828,12 +828,18 @@ TEST_F(Hostile, TheClockIsSetAgainAndAgain)
     }
 }
 
+// Else each message would look at all that wait for their paths.
 TEST_F(Hostile, NoPathFollowsTheAnnouncements)
 {
+    constexpr report::serviceid kMostWaiting = 1000;
     hear(0, 0, kCheckBegins, "/path");
-    for (int each = 0; each < 3 * kManyServices && seconds() < kMostSeconds; ++each) {
+    for (report::serviceid each = 0; each < kMostWaiting; ++each) {
         hear(0, 0, kServiceNamed, std::to_string(each));
     }
+    EXPECT_EQ(told.services(), 1U);
+    hear(0, 0, kServiceNamed, "one more");
+    EXPECT_EQ(told.services(), 2U);
+    EXPECT_EQ(told.nameof(1), "0");
 }
 
 TEST(Daemon, ThatEndsLeavesTheServicesInTheirOrder)

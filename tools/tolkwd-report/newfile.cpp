@@ -228,7 +228,8 @@ public:
         (void)fremovexattr(file.number(), kAccessList); // the folder may have given one
         const bool samegroup = fchown(file.number(), static_cast<uid_t>(-1), old.st_gid) == 0;
         setmode(modelike(at.file, old, samegroup));
-        (void)!fchown(file.number(), old.st_uid, static_cast<gid_t>(-1));
+        [[maybe_unused]] const int ignored =
+            fchown(file.number(), old.st_uid, static_cast<gid_t>(-1));
     }
 
     void rename()
