@@ -52,7 +52,7 @@ protected:
     void SetUp() override
     {
         if (geteuid() != 0) {
-            GTEST_SKIP() << "needs root";
+            GTEST_SKIP() << "only root can make files of other users";
         }
     }
 

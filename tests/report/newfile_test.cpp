@@ -324,12 +324,26 @@ TEST_F(NewFile, LeavesTheOldContentsToOtherHardLinks)
     EXPECT_EQ(textof(page), "a page");
 }
 
-// What is opened again by its name may be another file by then.
+// What is opened again by its name may be another file by then. Of two openings in a row inotify
+// tells one, so while the file is open its descriptors are looked at.
 TEST_F(NewFile, IsOpenedOnce)
 {
     const int watch = inotify_init1(IN_NONBLOCK | IN_CLOEXEC);
     ASSERT_GE(inotify_add_watch(watch, folder.c_str(), IN_OPEN | IN_CLOSE), 0);
-    writewhole(folder / "page", {}, writepage);
+    int descriptors = 0;
+    writewhole(folder / "page", {}, [&](std::ostream& out) {
+        writepage(out);
+        out.flush();
+        for (const auto& each : fs::directory_iterator("/proc/self/fd")) {
+            std::error_code gone; // the iterator's own
+            if (fs::read_symlink(each, gone).parent_path() == fs::canonical(folder)) {
+                const int fd = std::stoi(each.path().filename());
+                EXPECT_EQ(lseek(fd, 0, SEEK_CUR), 6); // one opening has one position
+                ++descriptors;
+            }
+        }
+    });
+    EXPECT_GT(descriptors, 0);
     alignas(inotify_event) std::array<char, 4096> events{};
     const ssize_t size = read(watch, events.data(), events.size());
     close(watch);
